@@ -1,0 +1,54 @@
+// The input side of a block: delay line and filters into the convolver's sliding window.
+#pragma once
+
+#include "base/aligned_array.h"
+#include "base/audio_thread.h"
+#include "engine/biquad.h"
+#include "engine/doppler_line.h"
+
+namespace tessaly {
+
+class InputFrontEnd {
+public:
+    /// Designs the four filters at their start cut-offs. Load time: logs.
+    void prepareFilters(int sampleRate);
+    /// Load time: allocates the window of 2 * `blocklenght` floats.
+    void prepareWindow(int blocklenght);
+
+    /// One block of input into the upper half of `inputHistory`. Block time.
+    /// @param input         interleaved stereo, `blocklenght` frames
+    /// @param inputChannel  0 or 1: which slot of a frame is read
+    void process(const float* input,
+                 int inputChannel,
+                 bool bassBoost,
+                 bool doppler,
+                 float distance,
+                 float distanceOld) noexcept TESSALY_NONBLOCKING;
+
+    /// Air absorption and near-field bass: both cut-offs follow the distance; the filters' state
+    /// runs on. Block time.
+    void followDistance(float distance) noexcept TESSALY_NONBLOCKING;
+
+    /// Occlusion 0..1 to a cut-off from 20000 to 200 Hz. Block time. @return the former level
+    float setInputLowPass(float level) noexcept TESSALY_NONBLOCKING;
+
+    AlignedArray<float> inputHistoryBuffer;
+    float* inputHistory = nullptr;  ///< 2 * `blocklenght` floats, newest block in the upper half
+    float inputGain = 1.0f;
+    float inputLowPassLevel = 0.0f;
+    float inputLowPass_Fc = 20000.0f;    ///< Hz
+    float highCut_Fc = 20000.0f;         ///< Hz
+    float lowCut_Fc = 10.0f;             ///< Hz
+    float bassShelveFilter_Fc = 400.0f;  ///< Hz
+    Biquad highCutFilter;
+    Biquad lowCutFilter;
+    Biquad bassShelveFilter;
+    Biquad inputLowPass;
+    DopplerLine doppler;
+
+private:
+    int sampleRate_ = 0;
+    int blocklenght_ = 0;
+};
+
+}  // namespace tessaly
