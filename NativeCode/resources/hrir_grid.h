@@ -6,13 +6,13 @@
 namespace tessaly {
 
 inline constexpr int gridStepDegrees = 5;
-inline constexpr int gridPhiCount = 73;     ///< azimuth indices 0..72; 0 and 72 are one direction
-inline constexpr int gridThetaCount = 37;   ///< elevation indices 0..36; 0 and 36 are the poles
-inline constexpr int gridPhiFront = 36;     ///< index of azimuth 0
-inline constexpr int gridThetaLevel = 18;   ///< index of elevation 0
+inline constexpr int gridPhiCount = 73;    ///< azimuth indices 0..72; 0 and 72 are one direction
+inline constexpr int gridThetaCount = 37;  ///< elevation indices 0..36; 0 and 36 are the poles
+inline constexpr int gridPhiFront = 36;    ///< index of azimuth 0
+inline constexpr int gridThetaLevel = 18;  ///< index of elevation 0
 inline constexpr int gridCellCount = gridPhiCount * gridThetaCount;
-inline constexpr int hrirCount = 2522;      ///< 72 azimuths * 35 elevations and the two poles
-inline constexpr int hrirMaxLength = 256;   ///< longest HRIR of any set, frames
+inline constexpr int hrirCount = 2522;     ///< 72 azimuths * 35 elevations and the two poles
+inline constexpr int hrirMaxLength = 256;  ///< longest HRIR of any set, frames
 
 /// Index of an azimuth in degrees, -180..180 to 0..72; truncating integer division.
 constexpr std::int16_t phiToIndex(int phi) noexcept {

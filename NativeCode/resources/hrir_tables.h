@@ -32,12 +32,21 @@ HrirSlot* filterTableCell(int indexPhi, int indexTheta) noexcept;
 
 /// The pair array behind a slot: frames of (right, left) floats, at least `hrirMaxLength` of them
 /// readable. Null if the slot is null or its entry is. Block time.
-inline const float* hrirOf(HrirSlot slot) noexcept {
-    return slot != nullptr ? *slot : nullptr;
-}
+inline const float* hrirOf(HrirSlot slot) noexcept { return slot != nullptr ? *slot : nullptr; }
 
 /// The pair array of a direction, null where nothing is mapped or off the grid. Block time.
 const float* hrirAt(int indexPhi, int indexTheta) noexcept;
+
+/// Replaces the packed set by `hrirCount` HRIRs of silence and points `hrirTable` at them, all of
+/// it, so that readers through older cells find memory whatever the file read then brings. The old
+/// set is released. Load time: allocates.
+/// @param hrirLength  frames per HRIR, the stride of the new set
+void replaceHrirStream(int hrirLength);
+
+/// Puts an HRIR of silence with an array of its own into the entry `nextFreeHrir` and steps that.
+/// The array lives until the process ends. Load time: allocates.
+/// @return the entry, or null if `hrirTable` is full
+HrirSlot appendHrir(int hrirLength);
 
 /// Releases everything and restores the start values. Only for tests, with no engine alive.
 void resetHrirTables();

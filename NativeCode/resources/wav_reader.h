@@ -26,7 +26,10 @@ struct WavSource {
 /// @param channels     channel count the file must have, 1 or 2
 /// @return true if read; on false `essError` holds -105 or -107 to -110 and `destination` may be
 ///         partly filled
-bool readWav(const WavSource& source, const std::string& path, float* destination, int frames,
+bool readWav(const WavSource& source,
+             const std::string& path,
+             float* destination,
+             int frames,
              std::int16_t channels);
 
 }  // namespace tessaly
