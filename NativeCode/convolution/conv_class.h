@@ -1,0 +1,174 @@
+// The partitioned overlap-save convolver: one mono stream in, a stereo pair out.
+#pragma once
+
+#include <cstdint>
+#include <string>
+#include <vector>
+
+#include "base/aligned_array.h"
+#include "convolution/spectral_primitives.h"
+
+namespace tessaly {
+
+struct Kernels;
+
+/// Instances of `convClass` ever constructed, never decremented. Written and read by construction:
+/// the instance that finds 0 is the one that fills `HpTF_Freq`.
+extern constinit std::int32_t convInstanceCount;
+/// Spectrum of the headphone compensation filter. Written by the first instance of the process
+/// alone, read by every instance; null until the first one makes it.
+extern constinit ComplexBin* HpTF_Freq;
+/// Bins behind `HpTF_Freq`: a later engine may have longer blocks than the one that made it.
+extern constinit std::int32_t HpTF_FreqBins;
+/// Floats behind the headphone filter in the time domain. Written by the engine that loads the
+/// filter, read where the filter is transformed; beyond it the filter counts as zero.
+extern constinit std::int32_t hpTFtimeLength;
+
+/// Puts the values above back to their start and releases the headphone spectra that are kept for
+/// the process's life. For test fixtures, and only while no `convClass` lives.
+void resetConvolutionState() noexcept;
+
+/// Uniformly partitioned convolution with two impulse responses that may change at any block.
+/// The impulse response is N partitions of one block length B, each held as a spectrum of B+1
+/// bins; the input is a ring of N spectra (`FDL`). The class owns no policy: it reads the engine's
+/// buffers and flags by reference, and the engine moves `FDLpos` and swaps `FDL`.
+///
+/// With a second instance the engine lets it borrow `filterPartsL`, `filterPartsR`,
+/// `hpTFspectrumL` and `hpTFspectrumR` of the first one, entry by entry; it neither writes nor
+/// releases them, and does not run after the first one is gone.
+class convClass {
+public:
+    /// Load time: allocates. `essError` becomes -201 without a transform plan, -202 without memory
+    /// for a spectrum; the object stays safe to run and destroy, and its output is then undefined
+    /// or unchanged.
+    /// @param blockLength       B, a power of two from 2
+    /// @param input             2B floats, the sliding input window
+    /// @param outputL, outputR  2B floats each, results
+    /// @param firL, firR        `firBufferSize` floats each, at least 2B
+    /// @param directFilterFeed  transform the engine's FIR buffers as they stand, 2B samples of
+    /// them
+    /// @param isSecondInstance  1 for the instance that renders the old filter in crossfade blocks
+    /// @param hpTFtime          headphone filter, `hpTFtimeLength` floats, may be null
+    /// @param FIR_size          floats of impulse response, N * B
+    /// @param partitions        N, at least 1
+    convClass(std::string instanceName,
+              std::int32_t blockLength,
+              float*& input,
+              float*& outputL,
+              float*& outputR,
+              float*& firL,
+              float*& firR,
+              bool& filterChangeAll,
+              bool& forceUpdateAll,
+              bool& qualityFlagRef,
+              std::uint8_t directFilterFeed,
+              bool& filterUpdatePendingRef,
+              float& interpAngleOffsetRef,
+              float& distanceRef,
+              std::uint8_t isSecondInstance,
+              bool& fadingRef,
+              bool& secondOLSactive,
+              bool& hpTFactive,
+              float*& hpTFtime,
+              std::int16_t& hpTFselect,
+              float& blockGainLinearRef,
+              bool& holdInterpPairRef,
+              std::uint32_t& blockCounterRef,
+              std::int32_t FIR_size,
+              std::int32_t firBufferSize,
+              std::int16_t partitions);
+    ~convClass();
+    convClass(const convClass&) = delete;
+    convClass& operator=(const convClass&) = delete;
+
+    /// One block. The result is samples B to 2B - 1 of `outputL` and `outputR`, times 2B. Block
+    /// time; a changed headphone selection allocates, a refused transform logs.
+    /// @return `outputL`
+    float* process() noexcept;
+
+    /// Zeroes every spectrum in `FDL`. Block time.
+    void clearFDL() noexcept;
+
+    /// Makes the compensation spectrum ready and fresh, zeroed product spectra. Load time, and in
+    /// the block that first sees a changed selection: allocates.
+    void HpTF_Freq() noexcept;
+
+    std::int32_t convNumber = 0;
+    bool& filterChangeAll;
+    bool& forceUpdateAll;
+    bool& qualityFlagRef;
+    std::uint8_t directFilterFeed;
+    bool& filterUpdatePendingRef;
+    float& interpAngleOffsetRef;
+    std::uint8_t isSecondInstance;
+    bool& fadingRef;
+    bool& secondOLSactive;
+    float& distanceRef;
+    bool& hpTFactive;
+    std::int16_t hpTFselectSeen = 0;
+    std::uint8_t hpTFloaded = 0;
+    std::int16_t& hpTFselect;
+    std::string instanceName;
+    float*& input;
+    float*& outputL;
+    float*& outputR;
+    float*& firL;
+    float*& firR;
+    /// Per partition 2B floats: the samples last transformed, then B zeros. With
+    /// `directFilterFeed` entry 0 points at the engine's buffer, which stays the engine's.
+    std::vector<float*> timePartsL;
+    std::vector<float*> timePartsR;
+    float* hpTFtimeCopy = nullptr;
+    float*& hpTFtime;
+    std::int32_t fftLength = 0;    ///< 2B
+    std::int32_t blockLength = 0;  ///< B
+    std::int32_t binCount = 0;     ///< B+1
+    std::int32_t fftOrder = 0;     ///< log2 of 2B, truncated
+    TransformHandle fftHandle;
+    TransformHandle ifftHandle;
+    /// Never created: compensation of more than one partition stays refused.
+    TransformHandle fftHandleFull;
+    TransformHandle ifftHandleFull;
+    std::int32_t firLength = 0;
+    std::int32_t firLengthHalf = 0;
+    std::int32_t firBufferSize = 0;
+    float& blockGainLinearRef;
+    bool& holdInterpPairRef;
+    std::uint32_t& blockCounterRef;
+    std::int32_t dftiStatus = 0;  ///< status of the last call of the transform service
+    /// The larger of B+1 and `firLengthHalf` + 1 bins, so that both branches stay inside.
+    ComplexBin* hpTFspectrumL = nullptr;
+    ComplexBin* hpTFspectrumR = nullptr;
+    std::vector<ComplexBin*> FDL;     ///< ring of input spectra in use
+    std::vector<ComplexBin*> FDLown;  ///< first instance: its own ring, to restore `FDL` from
+    std::vector<ComplexBin*> filterPartsL;
+    std::vector<ComplexBin*> filterPartsR;
+    ComplexBin* accumL = nullptr;
+    ComplexBin* accumR = nullptr;
+    ComplexBin* macScratch = nullptr;
+    std::int16_t FDLpos = 0;  ///< ring index of the newest spectrum, 0 to N - 1
+    std::int16_t FDLtoBUFConv = 1;
+    std::int16_t partitionsAtCreation = 1;
+
+private:
+    void watchSelection() noexcept;
+    void updateFilter() noexcept;
+    void fullLengthBranch() noexcept;
+    void transformPartitions() noexcept;
+    void multiplyHeadphone(const ComplexBin* filter, ComplexBin* product) noexcept;
+    void accumulate() noexcept;
+    void accumulateStepwise(const std::vector<ComplexBin*>& parts, ComplexBin* accum) noexcept;
+
+    /// One block of memory for each array above; the stride between two spectra is whole cache
+    /// lines and no multiple of 4 KB, so that neighbours do not share cache sets.
+    std::int32_t stride_ = 0;
+    ComplexBin* ringMemory_ = nullptr;
+    ComplexBin* partsMemoryL_ = nullptr;
+    ComplexBin* partsMemoryR_ = nullptr;
+    AlignedArray<float> timeMemoryL_;
+    AlignedArray<float> timeMemoryR_;
+    std::int32_t hpTFbins_ = 0;  ///< bins behind hpTFspectrumL and hpTFspectrumR
+    const Kernels* kernels_ = nullptr;
+};
+
+}  // namespace tessaly

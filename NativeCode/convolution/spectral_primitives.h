@@ -1,0 +1,100 @@
+// The transform service, operations on complex arrays and the spectrum allocator of the convolver.
+#pragma once
+
+#include <cstdint>
+#include <memory>
+
+#include "base/audio_thread.h"
+
+namespace tessaly {
+
+/// One bin of a spectrum, real part first. A spectrum of a real block of 2B samples is B+1 bins
+/// in natural order; bins 0 (DC) and B (Nyquist) keep their imaginary part in the storage.
+struct ComplexBin {
+    float re;
+    float im;
+};
+static_assert(sizeof(ComplexBin) == 2 * sizeof(float));
+
+struct TransformPlan;
+struct TransformPlanDeleter {
+    void operator()(TransformPlan* plan) const noexcept;
+};
+
+/// Owner of one plan; null while empty. Used by one thread at a time: it holds work memory.
+using TransformHandle = std::unique_ptr<TransformPlan, TransformPlanDeleter>;
+
+/// Statuses of the transform service.
+constexpr std::int32_t transformOk = 0;
+constexpr std::int32_t transformNoMemory = 1;      ///< no memory for the plan
+constexpr std::int32_t transformBadLength = 2;     ///< not a power of two from 4 to 65536
+constexpr std::int32_t transformEmptyHandle = 3;   ///< no plan behind the handle
+constexpr std::int32_t transformBadSetting = 4;    ///< a setting this service does not offer
+constexpr std::int32_t transformNotCommitted = 5;  ///< the plan was never committed
+
+constexpr std::int32_t transformLengthMin = 4;
+constexpr std::int32_t transformLengthMax = 65536;
+
+/// Text of a status, never null.
+const char* transformMessage(std::int32_t status) noexcept;
+
+enum class TransformSetting : std::int32_t { conjugateEvenStorage = 10, placement = 11 };
+enum class TransformValue : std::int32_t { complexComplex = 39, inPlace = 43, notInPlace = 44 };
+
+/// Makes a plan for real blocks of `length` single-precision samples. Load time: allocates.
+/// @return a status; on failure the handle is null
+std::int32_t createTransform(TransformHandle& handle, std::int32_t length) noexcept;
+/// Accepts separate arrays and complex storage, the only forms there are. Load time.
+std::int32_t setTransformValue(const TransformHandle& handle,
+                               TransformSetting setting,
+                               TransformValue value) noexcept;
+/// Makes the plan usable. Load time.
+std::int32_t commitTransform(const TransformHandle& handle) noexcept;
+/// 2B reals to B+1 bins, e^(-i...), no scale factor; the arrays must not overlap. Block time.
+std::int32_t computeForward(const TransformHandle& handle,
+                            const float* input,
+                            ComplexBin* output) noexcept TESSALY_NONBLOCKING;
+/// B+1 bins to 2B reals, e^(+i...), no scale factor: forward and backward multiply by 2B. The
+/// imaginary parts of bins 0 and B are ignored; the arrays must not overlap. Block time.
+std::int32_t computeBackward(const TransformHandle& handle,
+                             const ComplexBin* input,
+                             float* output) noexcept TESSALY_NONBLOCKING;
+
+/// Creates, sets and commits a plan for `length` real samples. A failing step writes a trace line
+/// and the next one runs all the same. Load time: allocates.
+/// @return the status of the last step; `handle` is null if there is no plan
+std::int32_t createFFT(TransformHandle& handle, std::int32_t length) noexcept;
+/// Forward transform; a refusal is a line on the standard output log and leaves `output` as it
+/// was. Block time, but for that line.
+std::int32_t FFT(const float* input, ComplexBin* output, const TransformHandle& handle) noexcept;
+/// Backward transform; a refusal is a trace line and leaves `output` as it was. Block time.
+std::int32_t IFFT(const ComplexBin* input, float* output, const TransformHandle& handle) noexcept;
+
+/// Fills `slot` with `count` zeroed bins on a 64-byte boundary; load time. On failure (no memory,
+/// or a count below 1) the slot is null, `essError` is -202 and a trace line tells.
+void allocSpectrum(ComplexBin*& slot, std::int32_t count) noexcept;
+/// Releases a spectrum and empties its slot; a null slot is a trace line. Load time.
+void freeSpectrum(ComplexBin*& slot) noexcept;
+/// Zeroes bins 0 to `last` inclusive. A null spectrum or a negative `last` does nothing. Block
+/// time.
+void clearSpectrum(ComplexBin* spectrum, std::int32_t last) noexcept TESSALY_NONBLOCKING;
+
+/// y[i] = a[i] * b[i] and y[i] = a[i] + b[i]; y may be a or b itself. Block time.
+void vcMul(std::int32_t count,
+           const ComplexBin* a,
+           const ComplexBin* b,
+           ComplexBin* y) noexcept TESSALY_NONBLOCKING;
+void vcAdd(std::int32_t count,
+           const ComplexBin* a,
+           const ComplexBin* b,
+           ComplexBin* y) noexcept TESSALY_NONBLOCKING;
+
+/// Makes the service run out of plans or memory, for tests: each count is the number of requests
+/// that still succeed, negative for no limit. Written by tests, read by the two allocators.
+struct SpectralFaults {
+    std::int32_t plansLeft = -1;
+    std::int32_t spectraLeft = -1;
+};
+extern constinit SpectralFaults spectralFaults;
+
+}  // namespace tessaly
