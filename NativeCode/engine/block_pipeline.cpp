@@ -1,0 +1,234 @@
+// The order of a block, and no arithmetic of its own.
+#include <algorithm>
+
+#include "base/ess_error.h"
+#include "base/log.h"
+#include "base/numeric_conversion.h"
+#include "engine/engine_state.h"
+#include "engine/headphone_compensation.h"
+#include "engine/room_geometry.h"
+#include "engine/shared_state.h"
+#include "engine/spatial_engine.h"
+
+namespace tessaly {
+
+namespace {
+
+constexpr float forcedInterpAngleOffset = 2.5f;  // degrees, half a grid step
+
+void moveReflections(EngineState& state) noexcept {
+    if (state.switches.qvFlexReflections && state.switches.qvTrackDirection) {
+        updateReflections(state.reflections, state.direction, state.law, state.controls,
+                          state.switches, state.earlyFlexRefPreset, state.samplesPerMetre);
+    }
+}
+
+/// Engines that do not update always watch the mix values instead.
+void watchMixParameters(EngineState& state) noexcept {
+    if (state.switches.alwaysUpdateFilter != 0) {
+        return;
+    }
+    if (mixParametersDiffer(*state.mixParameters, state.mixParametersOld)) {
+        state.switches.mixParametersChanged = 1;
+    }
+    state.mixParametersOld = *state.mixParameters;
+}
+
+void readDistance(EngineState& state) noexcept {
+    DistanceLaw& law = state.law;
+    law.distanceNew = **state.distanceIn;
+    if (law.distanceNew != law.distance) {
+        law.distanceUpdate(state.switches, state.mixParameters->unityDistance != 0, filterChangeAll,
+                           forceUpdateAll);
+    }
+}
+
+void updateDirection(EngineState& state) noexcept {
+    SourceDirection& direction = state.direction;
+    direction.update(state.switches, filterChangeAll);
+    moveReflections(state);
+    if (!state.switches.interpolateAngles) {
+        return;
+    }
+    if (state.switches.alwaysUpdateFilter != 0) {
+        direction.filterUpdatePending = true;
+    }
+    direction.bookkeepSteps(state.switches, filterChangeAll);
+    if (direction.filterUpdatePending) {
+        direction.indexPhiOld = direction.indexPhi;
+        direction.indexThetaOld = direction.indexTheta;
+    }
+}
+
+void directionStage(EngineState& state) noexcept {
+    SourceDirection& direction = state.direction;
+    direction.phiNew = wrapToInt16(-int{**state.phiIn});  // the host's azimuth grows to the right
+    direction.thetaNew = **state.thetaIn;
+    if (direction.changed(state.switches) || state.switches.alwaysUpdateFilter == 1 ||
+        state.switches.mixParametersChanged == 1) {
+        updateDirection(state);
+    } else if (forceUpdateAll) {
+        if (state.switches.interpolateAngles) {
+            direction.interpAngleOffset = forcedInterpAngleOffset;
+            direction.filterUpdatePending = true;
+        }
+        if (state.switches.qvFlexReflections && state.switches.qvTrackDirection) {
+            filterChangeAll = true;
+            moveReflections(state);
+        }
+    }
+}
+
+void composeResponse(EngineState& state) noexcept {
+    CompositionInputs inputs{state.switches,    state.sizes,
+                             state.sampleRate,  state.direction,
+                             state.law,         *state.mixParameters,
+                             state.controls,    state.database->staticFilter,
+                             filterChangeAll,   forceUpdateAll,
+                             blockCounter,      state.frontEnd,
+                             state.reflections, state.tail};
+    state.composer.refreshFilter(inputs, state.interpolation);
+}
+
+void advanceRings(EngineState& state) noexcept {
+    convClass& first = *state.firstOLS;
+    first.FDLpos = static_cast<std::int16_t>((first.FDLpos + 1) % state.sizes.fdlCount);
+    if (state.secondOLS != nullptr) {
+        state.secondOLS->FDLpos = first.FDLpos;
+    }
+}
+
+/// The second convolver takes the input into its own ring and renders the response of the block
+/// before; the first borrows that ring for the block, renders the new response and gets its own
+/// ring back, in which this block's slot keeps what it held.
+void convolveThroughCrossfade(EngineState& state) {
+    convClass& first = *state.firstOLS;
+    convClass& second = *state.secondOLS;
+    state.output.secondOLSactive = true;
+    second.process();
+    for (int i = 0; i < state.sizes.fdlCount; ++i) {
+        first.FDL[i] = second.FDL[i];
+    }
+    first.process();
+    for (int i = 0; i < state.sizes.fdlCount; ++i) {
+        first.FDL[i] = first.FDLown[i];
+    }
+}
+
+void convolve(EngineState& state) {
+    if (essError != essErrorNone) {
+        logOutput("Tessaly_e ERROR: no comProcessing due to essError: ", essError);
+        return;
+    }
+    if (state.switches.fading && filterChangeAll && blockCounter != 0) {
+        convolveThroughCrossfade(state);
+    } else {
+        state.firstOLS->process();
+    }
+}
+
+void printDebugDump(const EngineState& state) {
+    const auto blocks = static_cast<std::uint32_t>(std::max(state.ambience.ATMO_BLOCKS, 1));
+    const std::size_t start = static_cast<std::size_t>(blockCounter % blocks) *
+                              static_cast<std::size_t>(state.sizes.fftLength);
+    for (std::size_t i = 0; i < 10; ++i) {
+        const std::size_t at = start + i;
+        std::cout << i << ">_"
+                  << (at < state.debugDumpBuffer.size() ? state.debugDumpBuffer[at] : 0.0f) << '\t';
+    }
+    std::cout << std::endl;
+}
+
+void outputStage(EngineState& state) {
+    OutputStage& output = state.output;
+    if (state.switches.fading && output.secondOLSactive) {
+        output.crossfade();
+    }
+    output.write(state.outBlock, state.ambience, state.switches.atmoSelect, blockCounter);
+    if (state.settings.debugDump != 0) {
+        printDebugDump(state);
+    }
+    state.direction.holdInterpPair = false;
+}
+
+/// Silence of an engine whose construction stopped.
+void renderNothing(const EngineState& state, float* output) {
+    if (essError != essErrorNone) {
+        logOutput("Tessaly_e ERROR: no comProcessing due to essError: ", essError);
+    }
+    if (state.sizes.blocklenght > 0 && output != nullptr) {
+        std::fill_n(output, std::size_t{2} * static_cast<std::size_t>(state.sizes.blocklenght),
+                    0.0f);
+    }
+}
+
+}  // namespace
+
+void processEngineBlock(EngineState& state, float*& input, float*& output) {
+    if (input == nullptr) {
+        logTrace("ERROR: Buffer-Input problem!!!");
+        return;
+    }
+    if (!state.complete) {
+        renderNothing(state, output);
+        return;
+    }
+    state.inBlock = input;
+    state.outBlock = output;
+    state.inputChannel = 0;
+    if (state.instanceNumber == 0) {
+        watchHeadphoneSelection(state.liveSettings->qvHpTFcompSelect, state.sizes.FIR_size,
+                                state.sizes.blocklenght, state.bundleBasePath);
+    }
+    state.output.setBlockGain(**state.gainDb, state.sizes.fftLength, hpTFactive);
+    watchMixParameters(state);
+
+    const auto interval =
+        static_cast<std::uint32_t>(std::max<std::int16_t>(state.switches.qvUpdateInterval, 1));
+    const bool tick = blockCounter % interval == 0;
+    if (tick) {
+        readDistance(state);
+    }
+    if (tick || forceUpdateAll) {
+        directionStage(state);
+    }
+    composeResponse(state);
+    state.frontEnd.process(state.inBlock, state.inputChannel, state.controls.bassBoost,
+                           state.switches.doppler, state.law.distance, state.law.distanceOld);
+    advanceRings(state);
+    convolve(state);
+    filterChangeAll = false;
+    forceUpdateAll = false;
+    outputStage(state);
+
+    if (state.instanceNumber >= engineCount - 1) {
+        ++blockCounter;
+    }
+    if (state.switches.interpolateAngles) {
+        state.direction.filterUpdatePending = false;
+    }
+    if (state.switches.fading) {
+        state.output.secondOLSactive = false;
+    }
+    state.law.distanceOld = state.law.distance;
+    state.switches.mixParametersChanged = 0;
+}
+
+bool SpatialEngine::comProcessing(float*& input, float*& output, std::int16_t /*slot*/) {
+    processEngineBlock(*state_, input, output);
+    return true;
+}
+
+float SpatialEngine::setInputLowPass(float level) noexcept {
+    return state_->frontEnd.setInputLowPass(level);
+}
+
+float SpatialEngine::getReverbDistanceGain() const noexcept {
+    return state_->law.reverbDistanceGain;
+}
+
+LiveControls& SpatialEngine::controls() noexcept { return state_->controls; }
+
+const LiveControls& SpatialEngine::controls() const noexcept { return state_->controls; }
+
+}  // namespace tessaly
