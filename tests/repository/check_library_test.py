@@ -20,7 +20,7 @@ SHOWN void* One(double x) { return ::operator new(static_cast<unsigned>(sin(x)))
 SHOWN int Two(int x) { return x + 1; }
 """
 LINK = (
-    "-shared -fPIC -fvisibility=hidden -static-libstdc++ -static-libgcc -Wl,--"
+    "-shared -fPIC -fvisibility=hidden -static-libstdc++ -static-libgcc "
     "-Wl,--gc-sections -Wl,-z,max-page-size=16384 -Wl,-z,noexecstack "
     "-Wl,-z,nodynamic-undefined-weak -Wl,--version-script={map}"
 ).split()
