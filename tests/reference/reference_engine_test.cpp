@@ -483,6 +483,20 @@ TEST(ReferenceEngine, RecordsAddDelayedCopiesThatFollowTheSource) {
     EXPECT_EQ(rig.engine->records[2].phi, -175);
 }
 
+TEST(ReferenceEngine, LengthsOfTailsAndTheirPartitions) {
+    EXPECT_EQ(tailFrames(23147, 44100), 21266);
+    EXPECT_EQ(tailFrames(220245, 48000), 220244);
+    EXPECT_EQ(tailFrames(4096, 24000), 2048);
+    EXPECT_EQ(tailFrames(4096, 44100), 3763);
+    Rig rig(twoTaps);
+    rig.options.blockLength = 512;
+    rig.options.qvReverb = 15;
+    rig.options.tail.pairs.assign(2 * 23147, 0.0f);
+    rig.build();
+    EXPECT_EQ(rig.engine->partitions(), 46);
+    EXPECT_EQ(rig.engine->firSize(), 23552);
+}
+
 TEST(ReferenceEngine, MissingFileStopsConstruction) {
     Process process;
     SourceInputs inputs;

@@ -128,6 +128,9 @@ struct EngineOptions {
 /// Frames of an HRIR at a rate: 70, 128, 139 at 24000, 44100, 48000 Hz, or 256.
 int hrirFrames(int sampleRate, bool use256);
 
+/// Frames of a tail at a rate, by its length at 48000 Hz; single precision can cut one frame off.
+int tailFrames(int framesAt48000, int sampleRate);
+
 /// Size of a room's reflection buffer by preset number 1 to 60, 0 for any other.
 int earlyFlexFirSizeOf(int preset);
 

@@ -31,6 +31,11 @@ int hrirFrames(int sampleRate, bool use256) {
     return truncateToInt32(static_cast<float>(sampleRate) * 128.0f * 2.2675737e-05f + 0.5f);
 }
 
+int tailFrames(int framesAt48000, int sampleRate) {
+    return truncateToInt32(static_cast<float>(sampleRate) * static_cast<float>(framesAt48000) *
+                           2.0833333e-05f);
+}
+
 int earlyFlexFirSizeOf(int preset) {
     switch (preset) {
         // clang-format off
