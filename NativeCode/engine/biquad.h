@@ -28,6 +28,10 @@ struct Biquad {
 
     /// The frequency as it is stored: NaN and values from 0.458 up become 0.458, negative ones 0.
     static double boundFrequency(double frequency) noexcept;
+    /// Cut-off in hertz over sample rate: divided in single precision, then widened.
+    static double normalise(float cutOff, int sampleRate) noexcept {
+        return static_cast<double>(cutOff / static_cast<float>(sampleRate));
+    }
     /// Computes the coefficients from the fields; state and other fields stay. Types above 6
     /// change nothing.
     void design() noexcept;
@@ -42,6 +46,13 @@ struct Biquad {
         Q = 0.707;
         gainDb = 0.0;
         redesign(frequency);
+    }
+    /// Redesigns unless this is the stored frequency. The stored one is bounded, so a frequency
+    /// above the bound redesigns every time, with the same result.
+    void follow(double frequency) noexcept {
+        if (normalisedFrequency != frequency) {
+            redesign(frequency);
+        }
     }
     /// One sample. Block time.
     float process(float sample) noexcept {
