@@ -21,7 +21,7 @@ public:
     void process(const float* input,
                  int inputChannel,
                  bool bassBoost,
-                 bool doppler,
+                 bool dopplerOn,
                  float distance,
                  float distanceOld) noexcept TESSALY_NONBLOCKING;
 
