@@ -5,9 +5,9 @@ usage: scripts/check_includes.py [ROOT]
 
 host -> handler -> engine -> {convolution, resources} -> base; convolution and resources do not
 know each other, nothing in NativeCode knows tests, tools or third-party code. Intrinsics stay in
-convolution/simd/, where a kernel source includes kernels.h, its intrinsics header and texts made
-for kernels (*.inl): an inline function of any other header, built with wide instructions, could
-become the copy the linker gives to every caller.
+convolution/simd/, where a kernel source includes kernels.h, its intrinsics header and headers of
+that folder whose whole code is in an unnamed namespace: an inline function of any other header,
+built with wide instructions, could become the copy the linker gives to every caller.
 """
 
 import re
@@ -42,22 +42,48 @@ INTRINSICS_OUTSIDE_SIMD = {"base/flush_denormals.h"}  # the floating-point mode 
 
 INCLUDE = re.compile(r'^\s*#\s*(?:include|import)\s*(?:<([^>]+)>|"([^"]+)"|(\S+))')
 MODULE = re.compile(r"\btessaly_(\w+)\b")
-SOURCES = {".h", ".cpp", ".inl"}
+SOURCES = {".h", ".cpp"}
+
+KERNEL_FOLDER = "convolution/simd"
+NO_KERNEL = {"dispatch.cpp", "kernels.h"}  # built for every machine, or plain declarations
+# What a text is made of as far as namespaces go; strings hold no braces in such headers.
+TOKEN = re.compile(r"namespace(?:\s+\w+(?:::\w+)*)?\s*\{|\{|\}|[^\s{}]+")
 
 
-def is_kernel_source(path):
-    """Sources compiled with wide instructions, and the texts included by them."""
-    if path.parent.as_posix() != "convolution/simd":
-        return False
-    return path.suffix == ".inl" or (path.suffix == ".cpp" and path.name != "dispatch.cpp")
+def is_kernel(path):
+    """Sources compiled with wide instructions, and the headers made for them."""
+    return path.parent.as_posix() == KERNEL_FOLDER and path.name not in NO_KERNEL
+
+
+def code_outside_unnamed_namespace(text):
+    """Returns the first piece of code that stands in no unnamed namespace, or None."""
+    text = re.sub(r"/\*.*?\*/|//[^\n]*", " ", text, flags=re.DOTALL)
+    text = re.sub(r"^\s*#(?:[^\n]*\\\n)*[^\n]*$", " ", text, flags=re.MULTILINE)
+    open_scopes = []
+    for token in TOKEN.findall(text):
+        if token.startswith("namespace") and token.endswith("{"):
+            open_scopes.append("unnamed" if token[9:-1].strip() == "" else "named")
+        elif token == "}":
+            if not open_scopes:
+                return token
+            open_scopes.pop()
+        elif "unnamed" not in open_scopes:
+            return token
+        elif token == "{":
+            open_scopes.append("block")
+    return None
 
 
 def check_source(native, path):
     """Yields (line number, complaint) for one file, path relative to NativeCode."""
     folder = path.parts[0]
-    simd = path.parent.as_posix() == "convolution/simd"
-    kernel = is_kernel_source(path)
+    simd = path.parent.as_posix() == KERNEL_FOLDER
+    kernel = is_kernel(path)
     text = (native / path).read_text(encoding="utf-8")
+    if kernel and path.suffix == ".h":
+        outside = code_outside_unnamed_namespace(text)
+        if outside is not None:
+            yield 1, f"a kernel header keeps all in an unnamed namespace, not so: {outside}"
     for number, line in enumerate(text.splitlines(), 1):
         match = INCLUDE.match(line)
         if not match:
@@ -84,7 +110,7 @@ def check_source(native, path):
                 yield number, f'"{local}": no such file'
             elif target.parts[0] != folder and target.parts[0] not in BELOW[folder]:
                 yield number, f'"{local}": {folder} must not know {target.parts[0]}'
-            elif kernel and local != "convolution/simd/kernels.h" and target.suffix != ".inl":
+            elif kernel and target.parent.as_posix() != KERNEL_FOLDER:
                 yield number, f'"{local}": a kernel includes kernels.h and intrinsics only'
 
 

@@ -15,6 +15,10 @@ GOOD = {
     "convolution/simd/kernels.h": "#include <cstddef>\n",
     "convolution/simd/kernels_avx2.cpp": '#include "convolution/simd/kernels.h"\n'
     "#include <immintrin.h>\n",
+    "convolution/simd/lanes.h": '// x\n#pragma once\n#include "convolution/simd/kernels.h"\n'
+    "#define ONE \\\n 1\nnamespace tessaly {\nnamespace {\nstruct A { int f() { return ONE; } };\n"
+    "}  // namespace\n}  // namespace tessaly\n",
+    "convolution/simd/kernels_sse2.cpp": '#include "convolution/simd/lanes.h"\n',
     "convolution/simd/dispatch.cpp": '#include "convolution/simd/kernels.h"\n#include <atomic>\n',
     "resources/wav.h": '#include "base/log.h"\n',
     "engine/engine.h": '#include "convolution/conv.h"\n#include "resources/wav.h"\n',
@@ -105,6 +109,16 @@ class CheckIncludes(unittest.TestCase):
                 self.assert_complaint(
                     "convolution/simd/kernels_sse2.cpp", f"#include {include}\n", "a kernel includes"
                 )
+
+    def test_refuses_kernel_headers_with_code_for_everyone(self):
+        for text in [
+            "namespace tessaly {\ninline int f() { return 1; }\n}\n",
+            "namespace tessaly {\nnamespace {\nint g() { return 1; }\n}\ntemplate <class T> T h();\n}\n",
+            "namespace tessaly {\nnamespace detail {\nstruct B {};\n}\n}\n",
+            "inline int k() { return 1; }\nnamespace {\n}\n",
+        ]:
+            with self.subTest(text=text):
+                self.assert_complaint("convolution/simd/lanes.h", text, "in an unnamed namespace")
 
     def test_refuses_a_link_list_that_points_upwards(self):
         self.assert_complaint(
