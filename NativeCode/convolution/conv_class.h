@@ -145,19 +145,27 @@ public:
     std::vector<ComplexBin*> filterPartsR;
     ComplexBin* accumL = nullptr;
     ComplexBin* accumR = nullptr;
-    ComplexBin* macScratch = nullptr;
     std::int16_t FDLpos = 0;  ///< ring index of the newest spectrum, 0 to N - 1
     std::int16_t FDLtoBUFConv = 1;
     std::int16_t partitionsAtCreation = 1;
 
 private:
+    std::size_t newestSlot() const noexcept;
+    std::int32_t headphoneBins() const noexcept;
+    void transformHeadphoneFilter() noexcept;
     void watchSelection() noexcept;
     void updateFilter() noexcept;
+    void feedDirectly(float* fir,
+                      std::vector<float*>& timeParts,
+                      const std::vector<ComplexBin*>& filterParts) noexcept;
+    void transformPartitions(const float* fir,
+                             const std::vector<float*>& timeParts,
+                             const std::vector<ComplexBin*>& filterParts) noexcept;
     void fullLengthBranch() noexcept;
-    void transformPartitions() noexcept;
-    void multiplyHeadphone(const ComplexBin* filter, ComplexBin* product) noexcept;
+    static void multiplyHeadphone(const ComplexBin* filter,
+                                  ComplexBin* product,
+                                  std::int32_t bins) noexcept;
     void accumulate() noexcept;
-    void accumulateStepwise(const std::vector<ComplexBin*>& parts, ComplexBin* accum) noexcept;
 
     /// One block of memory for each array above; the stride between two spectra is whole cache
     /// lines and no multiple of 4 KB, so that neighbours do not share cache sets.
@@ -167,7 +175,6 @@ private:
     ComplexBin* partsMemoryR_ = nullptr;
     AlignedArray<float> timeMemoryL_;
     AlignedArray<float> timeMemoryR_;
-    std::int32_t hpTFbins_ = 0;  ///< bins behind hpTFspectrumL and hpTFspectrumR
     const Kernels* kernels_ = nullptr;
 };
 

@@ -5,16 +5,9 @@
 #include <memory>
 
 #include "base/audio_thread.h"
+#include "convolution/complex_bin.h"
 
 namespace tessaly {
-
-/// One bin of a spectrum, real part first. A spectrum of a real block of 2B samples is B+1 bins
-/// in natural order; bins 0 (DC) and B (Nyquist) keep their imaginary part in the storage.
-struct ComplexBin {
-    float re;
-    float im;
-};
-static_assert(sizeof(ComplexBin) == 2 * sizeof(float));
 
 struct TransformPlan;
 struct TransformPlanDeleter {
@@ -31,6 +24,7 @@ constexpr std::int32_t transformBadLength = 2;     ///< not a power of two from 
 constexpr std::int32_t transformEmptyHandle = 3;   ///< no plan behind the handle
 constexpr std::int32_t transformBadSetting = 4;    ///< a setting this service does not offer
 constexpr std::int32_t transformNotCommitted = 5;  ///< the plan was never committed
+constexpr std::int32_t transformNullArray = 6;     ///< input or output is null
 
 constexpr std::int32_t transformLengthMin = 4;
 constexpr std::int32_t transformLengthMax = 65536;

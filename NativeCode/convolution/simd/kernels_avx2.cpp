@@ -1,0 +1,66 @@
+// Kernels for x86 with AVX2 and FMA, eight lanes.
+#include "convolution/simd/kernels.h"
+
+#if defined(__AVX2__)
+
+#include <immintrin.h>
+
+#include "convolution/simd/lanes_scalar.h"
+#include "convolution/simd/lanes_x86.h"
+
+namespace tessaly {
+namespace {
+
+std::int32_t transformLanes(std::int32_t points) {
+    if (points >= 64) {
+        return 8;
+    }
+    if (points >= 16) {
+        return 4;
+    }
+    return 1;
+}
+
+void forward(const TransformTables& tables, const float* input, ComplexBin* bins, float* work) {
+    if (tables.lanes == 8) {
+        return forwardLanes<Lanes8>(tables, input, bins, work);
+    }
+    if (tables.lanes == 4) {
+        return forwardLanes<Lanes4>(tables, input, bins, work);
+    }
+    forwardLanes<LanesScalar>(tables, input, bins, work);
+}
+
+void backward(const TransformTables& tables, const ComplexBin* bins, float* output, float* work) {
+    if (tables.lanes == 8) {
+        return backwardLanes<Lanes8>(tables, bins, output, work);
+    }
+    if (tables.lanes == 4) {
+        return backwardLanes<Lanes4>(tables, bins, output, work);
+    }
+    backwardLanes<LanesScalar>(tables, bins, output, work);
+}
+
+constexpr Kernels table{.name = "avx2",
+                        .transformLanes = transformLanes,
+                        .forward = forward,
+                        .backward = backward,
+                        .multiply = multiplyBins<Lanes8>,
+                        .add = addBins<Lanes8>,
+                        .ringSum = sumRing<Lanes8>};
+
+}  // namespace
+
+constinit const Kernels* const kernelsAvx2 = &table;
+
+}  // namespace tessaly
+
+#else
+
+namespace tessaly {
+
+constinit const Kernels* const kernelsAvx2 = nullptr;
+
+}  // namespace tessaly
+
+#endif

@@ -1,0 +1,59 @@
+// Kernels for 64-bit ARM, four lanes.
+#include "convolution/simd/kernels.h"
+
+#if defined(__aarch64__) || defined(_M_ARM64) || defined(TESSALY_EMULATED_NEON)
+
+#if !defined(TESSALY_EMULATED_NEON)
+#include <arm_neon.h>
+#endif
+
+#include "convolution/simd/lanes_neon.h"
+#include "convolution/simd/lanes_scalar.h"
+
+namespace tessaly {
+namespace {
+
+std::int32_t transformLanes(std::int32_t points) {
+    if (points >= 16) {
+        return 4;
+    }
+    return 1;
+}
+
+void forward(const TransformTables& tables, const float* input, ComplexBin* bins, float* work) {
+    if (tables.lanes == 4) {
+        return forwardLanes<LanesNeon>(tables, input, bins, work);
+    }
+    forwardLanes<LanesScalar>(tables, input, bins, work);
+}
+
+void backward(const TransformTables& tables, const ComplexBin* bins, float* output, float* work) {
+    if (tables.lanes == 4) {
+        return backwardLanes<LanesNeon>(tables, bins, output, work);
+    }
+    backwardLanes<LanesScalar>(tables, bins, output, work);
+}
+
+constexpr Kernels table{.name = "neon",
+                        .transformLanes = transformLanes,
+                        .forward = forward,
+                        .backward = backward,
+                        .multiply = multiplyBins<LanesNeon>,
+                        .add = addBins<LanesNeon>,
+                        .ringSum = sumRing<LanesNeon>};
+
+}  // namespace
+
+constinit const Kernels* const kernelsNeon = &table;
+
+}  // namespace tessaly
+
+#else
+
+namespace tessaly {
+
+constinit const Kernels* const kernelsNeon = nullptr;
+
+}  // namespace tessaly
+
+#endif

@@ -1,0 +1,57 @@
+// Plain kernels, for every CPU.
+#include "convolution/simd/kernels.h"
+#include "convolution/simd/lanes_scalar.h"
+
+namespace tessaly {
+namespace {
+
+std::int32_t transformLanes(std::int32_t) { return 1; }
+
+void multiply(std::size_t bins, const ComplexBin* a, const ComplexBin* b, ComplexBin* y) {
+    for (std::size_t i = 0; i < bins; ++i) {
+        y[i] = product(a[i], b[i]);
+    }
+}
+
+void add(std::size_t bins, const ComplexBin* a, const ComplexBin* b, ComplexBin* y) {
+    for (std::size_t i = 0; i < bins; ++i) {
+        y[i] = sum(a[i], b[i]);
+    }
+}
+
+void ringSum(std::size_t bins,
+             std::size_t partitions,
+             std::size_t newest,
+             const ComplexBin* const* ring,
+             const ComplexBin* const* left,
+             const ComplexBin* const* right,
+             ComplexBin* sumL,
+             ComplexBin* sumR) {
+    std::size_t slot = newest;
+    std::size_t part = 0;
+    for (std::size_t n = 0; n < partitions; ++n) {
+        const ComplexBin* x = ring[slot];
+        const ComplexBin* l = left[part];
+        const ComplexBin* r = right[part];
+        for (std::size_t i = 0; i < bins; ++i) {
+            sumL[i] = n == 0 ? product(x[i], l[i]) : sum(product(x[i], l[i]), sumL[i]);
+            sumR[i] = n == 0 ? product(x[i], r[i]) : sum(product(x[i], r[i]), sumR[i]);
+        }
+        slot = slot + 1 == partitions ? 0 : slot + 1;
+        part = part == 0 ? partitions - 1 : part - 1;
+    }
+}
+
+constexpr Kernels table{.name = "scalar",
+                        .transformLanes = transformLanes,
+                        .forward = forwardLanes<LanesScalar>,
+                        .backward = backwardLanes<LanesScalar>,
+                        .multiply = multiply,
+                        .add = add,
+                        .ringSum = ringSum};
+
+}  // namespace
+
+constinit const Kernels* const kernelsScalar = &table;
+
+}  // namespace tessaly

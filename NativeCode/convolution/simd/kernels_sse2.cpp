@@ -1,0 +1,57 @@
+// Kernels for x86 with SSE2, four lanes.
+#include "convolution/simd/kernels.h"
+
+#if defined(__SSE2__) || defined(_M_X64)
+
+#include <emmintrin.h>
+
+#include "convolution/simd/lanes_scalar.h"
+#include "convolution/simd/lanes_x86.h"
+
+namespace tessaly {
+namespace {
+
+std::int32_t transformLanes(std::int32_t points) {
+    if (points >= 16) {
+        return 4;
+    }
+    return 1;
+}
+
+void forward(const TransformTables& tables, const float* input, ComplexBin* bins, float* work) {
+    if (tables.lanes == 4) {
+        return forwardLanes<Lanes4>(tables, input, bins, work);
+    }
+    forwardLanes<LanesScalar>(tables, input, bins, work);
+}
+
+void backward(const TransformTables& tables, const ComplexBin* bins, float* output, float* work) {
+    if (tables.lanes == 4) {
+        return backwardLanes<Lanes4>(tables, bins, output, work);
+    }
+    backwardLanes<LanesScalar>(tables, bins, output, work);
+}
+
+constexpr Kernels table{.name = "sse2",
+                        .transformLanes = transformLanes,
+                        .forward = forward,
+                        .backward = backward,
+                        .multiply = multiplyBins<Lanes4>,
+                        .add = addBins<Lanes4>,
+                        .ringSum = sumRing<Lanes4>};
+
+}  // namespace
+
+constinit const Kernels* const kernelsSse2 = &table;
+
+}  // namespace tessaly
+
+#else
+
+namespace tessaly {
+
+constinit const Kernels* const kernelsSse2 = nullptr;
+
+}  // namespace tessaly
+
+#endif

@@ -1,0 +1,226 @@
+// The transform service and its reports, vector operations and the spectrum allocator.
+#include "convolution/spectral_primitives.h"
+
+#include <bit>
+#include <cstddef>
+#include <cstring>
+#include <new>
+
+#include "base/aligned_array.h"
+#include "base/ess_error.h"
+#include "base/log.h"
+#include "convolution/simd/kernels.h"
+#include "convolution/transform_tables.h"
+
+namespace tessaly {
+namespace {
+
+constexpr std::size_t spectrumAlignment = 64;
+
+/// Takes one request from a count that tests may have limited.
+bool stillAllowed(std::int32_t& left) noexcept {
+    if (left == 0) {
+        return false;
+    }
+    if (left > 0) {
+        --left;
+    }
+    return true;
+}
+
+}  // namespace
+
+constinit SpectralFaults spectralFaults;
+
+struct TransformPlan {
+    explicit TransformPlan(std::int32_t length)
+        : kernels(selectKernels()),
+          tables(transformTables(length / 2, kernels.transformLanes(length / 2))),
+          work(transformWorkFloats(length / 2)) {}
+
+    const Kernels& kernels;
+    const TransformTables* tables;
+    AlignedArray<float> work;
+    bool committed = false;
+};
+
+void TransformPlanDeleter::operator()(TransformPlan* plan) const noexcept { delete plan; }
+
+const char* transformMessage(std::int32_t status) noexcept {
+    switch (status) {
+        case transformOk:
+            return "no error";
+        case transformNoMemory:
+            return "no memory for the transform";
+        case transformBadLength:
+            return "transform length is not supported";
+        case transformEmptyHandle:
+            return "transform handle is empty";
+        case transformBadSetting:
+            return "transform setting is not supported";
+        case transformNotCommitted:
+            return "transform is not committed";
+        case transformNullArray:
+            return "transform input or output is missing";
+        default:
+            return "unknown transform status";
+    }
+}
+
+std::int32_t createTransform(TransformHandle& handle, std::int32_t length) noexcept {
+    handle.reset();
+    if (length < transformLengthMin || length > transformLengthMax ||
+        !std::has_single_bit(static_cast<std::uint32_t>(length))) {
+        return transformBadLength;
+    }
+    if (!stillAllowed(spectralFaults.plansLeft)) {
+        return transformNoMemory;
+    }
+    try {
+        handle.reset(new TransformPlan(length));
+    } catch (const std::bad_alloc&) {
+        return transformNoMemory;
+    }
+    if (handle->tables == nullptr) {
+        handle.reset();
+        return transformNoMemory;
+    }
+    return transformOk;
+}
+
+std::int32_t setTransformValue(const TransformHandle& handle,
+                               TransformSetting setting,
+                               TransformValue value) noexcept {
+    if (handle == nullptr) {
+        return transformEmptyHandle;
+    }
+    const bool offered =
+        (setting == TransformSetting::placement && value == TransformValue::notInPlace) ||
+        (setting == TransformSetting::conjugateEvenStorage &&
+         value == TransformValue::complexComplex);
+    return offered ? transformOk : transformBadSetting;
+}
+
+std::int32_t commitTransform(const TransformHandle& handle) noexcept {
+    if (handle == nullptr) {
+        return transformEmptyHandle;
+    }
+    handle->committed = true;
+    return transformOk;
+}
+
+std::int32_t computeForward(const TransformHandle& handle,
+                            const float* input,
+                            ComplexBin* output) noexcept {
+    if (handle == nullptr) {
+        return transformEmptyHandle;
+    }
+    if (!handle->committed) {
+        return transformNotCommitted;
+    }
+    if (input == nullptr || output == nullptr) {
+        return transformNullArray;
+    }
+    handle->kernels.forward(*handle->tables, input, output, handle->work.data());
+    return transformOk;
+}
+
+std::int32_t computeBackward(const TransformHandle& handle,
+                             const ComplexBin* input,
+                             float* output) noexcept {
+    if (handle == nullptr) {
+        return transformEmptyHandle;
+    }
+    if (!handle->committed) {
+        return transformNotCommitted;
+    }
+    if (input == nullptr || output == nullptr) {
+        return transformNullArray;
+    }
+    handle->kernels.backward(*handle->tables, input, output, handle->work.data());
+    return transformOk;
+}
+
+std::int32_t createFFT(TransformHandle& handle, std::int32_t length) noexcept {
+    std::int32_t status = createTransform(handle, length);
+    if (status != transformOk) {
+        logTrace("ERROR: DftiCreateDescriptor not working! ", status);
+    }
+    status = setTransformValue(handle, TransformSetting::placement, TransformValue::notInPlace);
+    if (status != transformOk) {
+        logTrace("ERROR: DftiSetValue not working! ", status);
+    }
+    status = setTransformValue(handle, TransformSetting::conjugateEvenStorage,
+                               TransformValue::complexComplex);
+    if (status != transformOk) {
+        logTrace("ERROR: DftiSetValue not working! ", status);
+    }
+    status = commitTransform(handle);
+    if (status != transformOk) {
+        logTrace("ERROR: DftiCommitDescriptor not working! ", status);
+    }
+    return status;
+}
+
+std::int32_t FFT(const float* input, ComplexBin* output, const TransformHandle& handle) noexcept {
+    const std::int32_t status = computeForward(handle, input, output);
+    if (status != transformOk) {
+        logOutput("Tessaly ERROR: FFT not working! status ", status, ' ', transformMessage(status));
+    }
+    return status;
+}
+
+std::int32_t IFFT(const ComplexBin* input, float* output, const TransformHandle& handle) noexcept {
+    const std::int32_t status = computeBackward(handle, input, output);
+    if (status != transformOk) {
+        logTrace("Tessaly ERROR: IFFT not working! status ", status, ' ', transformMessage(status));
+    }
+    return status;
+}
+
+void allocSpectrum(ComplexBin*& slot, std::int32_t count) noexcept {
+    slot = nullptr;
+    if (count > 0 && stillAllowed(spectralFaults.spectraLeft)) {
+        const std::size_t bytes = static_cast<std::size_t>(count) * sizeof(ComplexBin);
+        void* const memory =
+            ::operator new (bytes, std::align_val_t{spectrumAlignment}, std::nothrow);
+        if (memory != nullptr) {
+            std::memset(memory, 0, bytes);
+            slot = static_cast<ComplexBin*>(memory);
+        }
+    }
+    if (slot == nullptr) {
+        logTrace("Tessaly_c: calloc not sucessfull yet!");
+        essError = essErrorSpectrumMemory;
+    }
+}
+
+void freeSpectrum(ComplexBin*& slot) noexcept {
+    if (slot == nullptr) {
+        logTrace(">>DEBUG_CONV: can not delete ", static_cast<const void*>(slot));
+        return;
+    }
+    ::operator delete (slot, std::align_val_t{spectrumAlignment});
+    slot = nullptr;
+}
+
+void clearSpectrum(ComplexBin* spectrum, std::int32_t last) noexcept {
+    if (spectrum != nullptr && last >= 0) {
+        const std::size_t bins = static_cast<std::size_t>(last) + 1;
+        std::memset(static_cast<void*>(spectrum), 0, bins * sizeof(ComplexBin));
+    }
+}
+
+void vcMul(std::int32_t count, const ComplexBin* a, const ComplexBin* b, ComplexBin* y) noexcept {
+    if (count > 0) {
+        selectKernels().multiply(static_cast<std::size_t>(count), a, b, y);
+    }
+}
+
+void vcAdd(std::int32_t count, const ComplexBin* a, const ComplexBin* b, ComplexBin* y) noexcept {
+    if (count > 0) {
+        selectKernels().add(static_cast<std::size_t>(count), a, b, y);
+    }
+}
+
+}  // namespace tessaly
