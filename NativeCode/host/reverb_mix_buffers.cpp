@@ -1,0 +1,59 @@
+// Birth, moves and filling of the mix buffers.
+#include "host/reverb_mix_buffers.h"
+
+#include <algorithm>
+
+#include "base/log.h"
+
+namespace tessaly {
+
+std::map<std::int32_t, ReverbMixBuffer> reverbmixbuffermap;
+
+ReverbMixBuffer* findMixBuffer(std::int32_t id) noexcept {
+    const auto entry = reverbmixbuffermap.find(id);
+    return entry != reverbmixbuffermap.end() ? &entry->second : nullptr;
+}
+
+void changeReverbId(std::int32_t oldId, std::int32_t newId) {
+    if (oldId == 0) {
+        if (reverbmixbuffermap.empty()) {
+            logTrace("Tessaly_sr: reverbmixbuffermap == 0");
+        }
+        if (newId != 0) {
+            reverbmixbuffermap[newId].fill(0.0f);
+        }
+        return;
+    }
+    if (oldId == newId) {
+        return;
+    }
+    if (newId != 0) {
+        ReverbMixBuffer& target = reverbmixbuffermap[newId];
+        if (const ReverbMixBuffer* source = findMixBuffer(oldId)) {
+            target = *source;
+        } else {
+            // Another reverb with the old ID was released and took the buffer with it.
+            target.fill(0.0f);
+        }
+    }
+    reverbmixbuffermap.erase(oldId);
+}
+
+void addToMixBuffer(ReverbMixBuffer& mix,
+                    const float* in,
+                    std::size_t frames,
+                    int inchannels,
+                    float gain) noexcept {
+    const std::size_t count = std::min(frames, mixBufferFrames);
+    if (inchannels == 2) {
+        for (std::size_t i = 0; i < count; ++i) {
+            mix[2 * i] += (in[2 * i] + in[2 * i + 1]) * gain;
+        }
+    } else if (inchannels == 1) {
+        for (std::size_t i = 0; i < count; ++i) {
+            mix[2 * i] += in[i] * gain;
+        }
+    }
+}
+
+}  // namespace tessaly
