@@ -28,11 +28,17 @@ class BenchTables(unittest.TestCase):
     def test_splits_names_into_group_variant_and_key(self):
         for name, parts in {
             "Transform/tessaly_avx2/512": ("Transform", "tessaly_avx2", ("512",)),
+            "Mac/avx2/256/8": ("Mac", "avx2", ("256", "8")),
             "Mac/plain/256/8": ("Mac", "plain", ("256", "8")),
             "Process/moving/tessaly/1024/46": ("Process", "tessaly", ("moving", "1024", "46")),
             "Engine/compose/48000/real_time": ("Engine", "time", ("compose", "48000")),
         }.items():
             self.assertEqual(bench.split_name(name), parts)
+
+    def test_columns_go_from_our_widest_to_the_others(self):
+        names = ["fftw", "plain", "scalar", "tessaly_sse2", "avx2", "tessaly", "tessaly_avx2"]
+        wanted = ["tessaly", "tessaly_avx2", "tessaly_sse2", "avx2", "scalar", "plain", "fftw"]
+        self.assertEqual(sorted(names, key=bench.variant_order), wanted)
 
     def test_takes_medians_in_one_unit_and_the_named_clock(self):
         groups = bench.collect(
