@@ -1,0 +1,159 @@
+// The command line: what is accepted, and the one line for what is not.
+#include "render/options.h"
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+namespace tessaly {
+namespace {
+
+using ::testing::HasSubstr;
+
+RenderOptions parse(std::vector<const char*> words) {
+    words.insert(words.begin(), "tessaly-render");
+    return parseOptions(static_cast<int>(words.size()), words.data(), "/default/data");
+}
+
+std::string failureOf(const std::vector<const char*>& words) {
+    try {
+        parse(words);
+    } catch (const UsageError& error) {
+        return error.what();
+    }
+    return "";
+}
+
+// With what every request needs in front.
+std::string failureWith(std::vector<const char*> words) {
+    words.insert(words.begin(), {"--sound", "bursts", "-o", "x.wav"});
+    return failureOf(words);
+}
+
+RenderOptions parseWith(std::vector<const char*> words) {
+    words.insert(words.begin(), {"--sound", "bursts", "-o", "x.wav"});
+    return parse(words);
+}
+
+TEST(Options, DefaultsAreAnOrbitInTheDry) {
+    const RenderOptions options = parse({"in.flac", "-o", "out/x.wav"});
+    EXPECT_EQ(options.input, "in.flac");
+    EXPECT_EQ(options.output, "out/x.wav");
+    EXPECT_EQ(options.picture, "out/x.svg");
+    EXPECT_EQ(options.sampleRate, 48000);
+    EXPECT_EQ(options.blockLength, 512);
+    EXPECT_EQ(options.room, 0);
+    EXPECT_EQ(options.dataDirectory, "/default/data");
+    EXPECT_EQ(options.format, SampleFormat::Float);
+    EXPECT_FALSE(options.duration.has_value());
+    const auto& orbit = std::get<OrbitPath>(options.path);
+    EXPECT_EQ(orbit.radius, 1.5);
+    EXPECT_EQ(orbit.turns, 1.0);
+    EXPECT_TRUE(orbit.clockwise);
+}
+
+TEST(Options, OrbitTakesAllItsNumbers) {
+    const RenderOptions options =
+        parseWith({"--orbit", "--radius", "0.5", "--period", "4", "--elevation", "-20", "--azimuth",
+                   "-90", "--direction", "anticlockwise"});
+    const auto& orbit = std::get<OrbitPath>(options.path);
+    EXPECT_EQ(orbit.radius, 0.5);
+    EXPECT_EQ(orbit.elevation, -20.0);
+    EXPECT_EQ(orbit.startAzimuth, -90.0);
+    EXPECT_FALSE(orbit.clockwise);
+    EXPECT_EQ(options.orbitPeriod, 4.0);
+}
+
+TEST(Options, NegativeNumbersAreValuesNotOptions) {
+    const RenderOptions at = parseWith({"--at", "-90,-10,2"});
+    const Spherical direction = sphericalOf(std::get<FixedPath>(at.path).position);
+    EXPECT_NEAR(direction.azimuth, -90.0, 1e-9);
+    EXPECT_NEAR(direction.elevation, -10.0, 1e-9);
+    EXPECT_NEAR(direction.distance, 2.0, 1e-9);
+    const RenderOptions line = parseWith({"--from", "-1,0,2", "--to", "1,-0.5,2"});
+    EXPECT_EQ(std::get<LinePath>(line.path).from.x, -1.0);
+    EXPECT_EQ(std::get<LinePath>(line.path).to.y, -0.5);
+    const RenderOptions rise = parseWith({"--rise", "-30,150", "--radius", "2"});
+    EXPECT_EQ(std::get<RisePath>(rise.path).fromElevation, -30.0);
+    EXPECT_EQ(std::get<RisePath>(rise.path).toElevation, 150.0);
+    EXPECT_EQ(std::get<RisePath>(rise.path).radius, 2.0);
+}
+
+TEST(Options, SettingsKeepTheirOrder) {
+    const RenderOptions options = parse({"--set", "Direct=-6", "in.wav", "--set", "Reverb Size=2",
+                                         "--set", "8=3.5", "-o", "x.wav"});
+    ASSERT_EQ(options.parameters.size(), 3u);
+    EXPECT_EQ(options.parameters[0], (std::pair<std::string, float>("Direct", -6.0f)));
+    EXPECT_EQ(options.parameters[1], (std::pair<std::string, float>("Reverb Size", 2.0f)));
+    EXPECT_EQ(options.parameters[2], (std::pair<std::string, float>("8", 3.5f)));
+    EXPECT_EQ(options.input, "in.wav");
+}
+
+TEST(Options, RoomsByNumberAndName) {
+    EXPECT_EQ(parseWith({"--room", "31"}).room, 31);
+    EXPECT_EQ(parseWith({"--room", "Warehouse"}).room, 31);
+}
+
+TEST(Options, PictureCanBeNamedOrLeftOut) {
+    EXPECT_EQ(parseWith({"--picture", "y.svg"}).picture, "y.svg");
+    EXPECT_TRUE(parseWith({"--no-picture"}).picture.empty());
+}
+
+TEST(Options, ListingNeedsNothingElse) { EXPECT_TRUE(parse({"--list"}).list); }
+
+TEST(Options, HelpIsNoFailure) { EXPECT_THROW(parse({"--help"}), HelpRequest); }
+
+struct Refusal {
+    std::vector<const char*> words;
+    const char* says;
+};
+
+TEST(Options, RefusalsSayWhatIsWrong) {
+    const Refusal refusals[] = {
+        {{"--rate", "32000"}, "no data for 32000 Hz"},
+        {{"--rate", "fast"}, "--rate needs a number, got \"fast\""},
+        {{"--rate", "48000.5"}, "--rate needs a whole number"},
+        {{"--block", "500"}, "--block must be a power of two from 32 to 4096, got 500"},
+        {{"--block", "16"}, "--block must be a power of two"},
+        {{"--block", "8192"}, "--block must be a power of two"},
+        {{"--duration", "0"}, "--duration must be"},
+        {{"--duration", "nan"}, "--duration needs a number"},
+        {{"--duration", "1e9"}, "--duration must be"},
+        {{"--radius", "-1"}, "--radius must be"},
+        {{"--turns", "x"}, "--turns needs a number, got \"x\""},
+        {{"--turns", "2", "--period", "3"}, "either --turns or --period"},
+        {{"--direction", "up"}, "--direction must be clockwise or anticlockwise"},
+        {{"--at", "1,2"}, "--at needs 3 numbers"},
+        {{"--at", "0,91,1"}, "--at takes"},
+        {{"--at-xyz", "1,2,x"}, "--at-xyz needs 3 numbers"},
+        {{"--at-xyz", "1,2,3e9"}, "--at-xyz must lie within"},
+        {{"--from", "1,2,3"}, "both --from and --to"},
+        {{"--rise", "0"}, "--rise needs 2 numbers"},
+        {{"--rise", "0,400"}, "--rise takes elevations"},
+        {{"--at", "0,0,1", "--orbit"}, "only one of"},
+        {{"--at", "0,0,1", "--at-xyz", "0,0,1"}, "only one of"},
+        {{"--at", "0,0,1", "--turns", "2"}, "--turns has no meaning for a fixed position"},
+        {{"--set", "Direct"}, "--set needs NAME=VALUE"},
+        {{"--set", "=1"}, "--set needs NAME=VALUE"},
+        {{"--set", "Direct=loud"}, "--set needs a number after ="},
+        {{"--room", "53"}, "unknown room \"53\""},
+        {{"--room", "Kitchen"}, "unknown room \"Kitchen\""},
+        {{"--format", "8"}, "--format must be float, 16 or 24"},
+        {{"--picture", "x.png"}, "must end in .svg"},
+        {{"--no-picture", "--picture", "x.svg"}, "--picture has no meaning"},
+        {{"in.wav"}, "either a sound file or --sound"},
+        {{"--bogus"}, "--bogus"},
+        {{"--rate"}, "--rate"},
+    };
+    for (const Refusal& refusal : refusals) {
+        const std::string failure = failureWith(refusal.words);
+        EXPECT_THAT(failure, HasSubstr(refusal.says));
+        EXPECT_EQ(failure.find('\n'), std::string::npos) << failure;
+    }
+    EXPECT_THAT(failureOf({"--sound", "harp", "-o", "x.wav"}), HasSubstr("unknown sound \"harp\""));
+    EXPECT_THAT(failureOf({"-o", "x.wav"}), HasSubstr("no sound given"));
+    EXPECT_THAT(failureOf({"in.wav"}), HasSubstr("no output given"));
+    EXPECT_THAT(failureOf({"in.wav", "-o", "x.flac"}), HasSubstr("must end in .wav"));
+}
+
+}  // namespace
+}  // namespace tessaly

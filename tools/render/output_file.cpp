@@ -1,0 +1,112 @@
+// Pending files, WAV writing, text writing.
+#include "render/output_file.h"
+
+#include <fcntl.h>
+#include <sndfile.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cerrno>
+#include <cmath>
+#include <cstring>
+#include <fstream>
+#include <memory>
+#include <stdexcept>
+#include <vector>
+
+namespace tessaly {
+
+namespace {
+
+struct CloseFile {
+    void operator()(SNDFILE* file) const noexcept { sf_close(file); }
+};
+
+int soundFormat(SampleFormat format) {
+    switch (format) {
+        case SampleFormat::Float:
+            return SF_FORMAT_WAV | SF_FORMAT_FLOAT;
+        case SampleFormat::Int16:
+            return SF_FORMAT_WAV | SF_FORMAT_PCM_16;
+        case SampleFormat::Int24:
+            return SF_FORMAT_WAV | SF_FORMAT_PCM_24;
+    }
+    return SF_FORMAT_WAV | SF_FORMAT_FLOAT;
+}
+
+std::runtime_error cannotWrite(const std::filesystem::path& file, const std::string& reason) {
+    return std::runtime_error("cannot write " + file.string() + ": " + reason);
+}
+
+}  // namespace
+
+PendingFile::PendingFile(const std::filesystem::path& finalFile)
+    : place(finalFile), passing(finalFile.string() + ".part-" + std::to_string(getpid())) {
+    std::error_code ignored;
+    if (std::filesystem::is_directory(place, ignored)) {
+        throw cannotWrite(place, "it is a directory");
+    }
+    const int descriptor = open(passing.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0666);
+    if (descriptor < 0) {
+        throw cannotWrite(place, std::strerror(errno));
+    }
+    close(descriptor);
+}
+
+PendingFile::~PendingFile() {
+    if (pending) {
+        std::error_code ignored;
+        std::filesystem::remove(passing, ignored);
+    }
+}
+
+void PendingFile::complete() {
+    std::error_code failure;
+    std::filesystem::rename(passing, place, failure);
+    if (failure) {
+        throw cannotWrite(place, failure.message());
+    }
+    pending = false;
+}
+
+std::size_t writeWav(const PendingFile& file,
+                     std::span<const float> stereo,
+                     int sampleRate,
+                     SampleFormat format) {
+    SF_INFO info{};
+    info.channels = 2;
+    info.samplerate = sampleRate;
+    info.format = soundFormat(format);
+    std::unique_ptr<SNDFILE, CloseFile> opened(
+        sf_open(file.passingName().c_str(), SFM_WRITE, &info));
+    if (!opened) {
+        throw cannotWrite(file.passingName(), sf_strerror(nullptr));
+    }
+    // Without clipping, a value beyond full scale would wrap round in the integer formats.
+    sf_command(opened.get(), SFC_SET_CLIPPING, nullptr, SF_TRUE);
+    std::size_t cut = 0;
+    if (format != SampleFormat::Float) {
+        cut = static_cast<std::size_t>(std::count_if(stereo.begin(), stereo.end(),
+                                                     [](float x) { return std::abs(x) > 1.0f; }));
+    }
+    const auto frames = static_cast<sf_count_t>(stereo.size() / 2);
+    const bool written = sf_writef_float(opened.get(), stereo.data(), frames) == frames;
+    if (!written || sf_error(opened.get()) != SF_ERR_NO_ERROR) {
+        throw cannotWrite(file.passingName(), sf_strerror(opened.get()));
+    }
+    if (sf_close(opened.release()) != 0) {
+        throw cannotWrite(file.passingName(), "the file cannot be completed");
+    }
+    return cut;
+}
+
+void writeText(const PendingFile& file, const std::string& text) {
+    std::ofstream stream(file.passingName(), std::ios::binary | std::ios::trunc);
+    stream << text;
+    stream.close();
+    if (!stream) {
+        throw cannotWrite(file.passingName(), "the text cannot be stored");
+    }
+}
+
+}  // namespace tessaly
