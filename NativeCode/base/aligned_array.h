@@ -21,8 +21,8 @@ public:
     AlignedArray() noexcept = default;
     explicit AlignedArray(std::size_t size) : size_(size) {
         if (size_ > 0) {
-            data_ = static_cast<T*>(
-                ::operator new(size_ * sizeof(T), std::align_val_t{alignment}));
+            data_ =
+                static_cast<T*>(::operator new (size_ * sizeof(T), std::align_val_t{alignment}));
             clear();
         }
     }
@@ -61,7 +61,7 @@ public:
 private:
     void release() noexcept {
         if (data_ != nullptr) {
-            ::operator delete(data_, std::align_val_t{alignment});
+            ::operator delete (data_, std::align_val_t{alignment});
         }
     }
 

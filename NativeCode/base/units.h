@@ -9,8 +9,6 @@ namespace tessaly {
 inline constexpr double samplesPerMetrePerHertz = 0.0029118863199580685;
 
 /// Level in dB to a linear factor, 10^(dB / 20), in single precision throughout.
-inline float decibelsToLinear(float levelDb) noexcept {
-    return std::pow(10.0f, levelDb * 0.05f);
-}
+inline float decibelsToLinear(float levelDb) noexcept { return std::pow(10.0f, levelDb * 0.05f); }
 
 }  // namespace tessaly
