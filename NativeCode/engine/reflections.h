@@ -7,9 +7,12 @@
 #include "engine/biquad.h"
 #include "engine/engine_settings.h"
 #include "engine/live_controls.h"
+#include "engine/reverb_tail.h"
 #include "resources/hrir_database.h"
 
 namespace tessaly {
+
+struct RoomPreset;
 
 /// One reflection of the room.
 struct ReflectionRecord {
@@ -45,6 +48,7 @@ public:
         HrirDatabase& database;
         HrirRequest request;     ///< the engine's direction fields
         LiveControls& controls;  ///< takes the preset's cut-offs and walls
+        ReverbTail& tail;        ///< takes the preset's low-pass
         int& FIR_size;           ///< raised to what the room needs
     };
 
@@ -70,6 +74,12 @@ public:
     std::int16_t earlyRefLength_2nd = 0;
     HrirSlot earlyRefFilter_1st = nullptr;  ///< null: silent
     HrirSlot earlyRefFilter_2nd = nullptr;
+
+private:
+    void takePreset(const LoadContext& context, const RoomPreset& preset);
+    void makeRecords(const LoadContext& context, const RoomPreset& preset);
+    /// Fetches the direction of a record into its cell, for engines without the full table.
+    static void loadRecordHrir(const LoadContext& context, ReflectionRecord& record);
 };
 
 }  // namespace tessaly
