@@ -3,6 +3,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <cstddef>
 #include <numbers>
 
 #include "base/precision.h"
@@ -32,9 +33,9 @@ void writePanPair(float* pair, int hrirLength, std::int16_t phi, float panGain) 
     const int posFirst = std::clamp(static_cast<int>(wide(s) * half * 0.5), 0, hrirLength - 1);
     const int posSecond = std::clamp(static_cast<int>(half - posFirst), 0, hrirLength - 1);
 
-    std::fill_n(pair, hrirLength * 2, 0.0f);
-    pair[posFirst * 2] = tapFirst;
-    pair[posSecond * 2 + 1] = tapSecond;
+    std::fill_n(pair, std::size_t{2} * static_cast<std::size_t>(hrirLength), 0.0f);
+    pair[std::ptrdiff_t{2} * posFirst] = tapFirst;
+    pair[std::ptrdiff_t{2} * posSecond + 1] = tapSecond;
 }
 
 }  // namespace tessaly

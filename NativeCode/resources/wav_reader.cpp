@@ -44,7 +44,7 @@ T readAt(std::ifstream& file, std::streamoff offset) {
 /// of `destination` stays as it is.
 template <typename Stored, typename Convert>
 void readSamples(std::ifstream& file, float* destination, std::uint32_t count, Convert convert) {
-    std::array<Stored, 4096> chunk;
+    std::array<Stored, 4096> chunk{};
     while (count > 0) {
         const std::uint32_t asked = std::min<std::uint32_t>(count, chunk.size());
         file.read(reinterpret_cast<char*>(chunk.data()),
@@ -89,7 +89,7 @@ bool readTail(const WavSource& source, float* destination) {
 }
 
 std::string resolveName(const WavSource& source, const std::string& path) {
-    const std::string name = source.bundleBasePath + path;
+    std::string name = source.bundleBasePath + path;
     if (source.usePackedDatabase) {
         return name;
     }
@@ -151,8 +151,9 @@ bool readWav(const WavSource& source,
     } else if (bits == 32) {
         readSamples<float>(file, destination, wanted, [](float value) { return value; });
     } else if (bits == 16) {
-        readSamples<std::int16_t>(file, destination, wanted,
-                                  [](std::int16_t value) { return value * fromInt16; });
+        readSamples<std::int16_t>(file, destination, wanted, [](std::int16_t value) {
+            return static_cast<float>(value) * fromInt16;
+        });
     } else {
         logBoth("Tessaly_e ERROR: Wav not 32 or 16 Bit!!!!");
         essError = essErrorWavBitDepth;
