@@ -112,13 +112,11 @@ void reflectAtWall(ReflectionRecord& record, int k, float wall, const Scene& sce
                                      scene.sinDistance,    -scene.sinDistance};
     if (wall <= limits[k]) {
         markOutside(record);
-        if (k == 2) {
-            logTrace("Ref ", k, " cosDistance = ", limits[k],
-                     " out of Room, ReflectionDistance set to 1000000!");
-        } else {
-            logTrace("Ref ", k, k < 4 ? " cosDistance = " : " sinDistance = ", limits[k],
-                     " out of RoomWall ", wall, " ReflectionDistance set to 1000000!");
-        }
+        const bool side = k >= 4;
+        logTrace("Ref ", k, side ? " sinDistance = " : " cosDistance = ",
+                 side ? scene.sinDistance : scene.cosDistance,
+                 k == 2 ? " out of Room, ReflectionDistance set to 1000000!"
+                        : " out of RoomWall  ReflectionDistance set to 1000000!");
         return;
     }
     switch (k) {
