@@ -3,6 +3,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <cstddef>
 #include <cstring>
 #include <limits>
 
@@ -57,7 +58,7 @@ void DopplerLine::process(const float* input,
     float* const line = dopplerLine.data();
     std::memmove(line, line + B, static_cast<std::size_t>(L - B) * sizeof(float));
     for (int i = 0; i < B; ++i) {
-        line[L - B + i] = input[2 * i] * inputGain;
+        line[L - B + i] = input[std::ptrdiff_t{2} * i] * inputGain;
     }
 
     const float start = static_cast<float>(std::int64_t{L} - B - dopplerDelayOld);

@@ -2,6 +2,7 @@
 #pragma once
 
 #include <algorithm>
+#include <cstddef>
 
 #include "engine/biquad.h"
 
@@ -19,6 +20,9 @@ struct EarPairs {
     const float* left;   ///< first left value; the next one is two floats further
     const float* right;  ///< first right value
     int frames;
+
+    float leftAt(int frame) const noexcept { return left[std::ptrdiff_t{2} * frame]; }
+    float rightAt(int frame) const noexcept { return right[std::ptrdiff_t{2} * frame]; }
 };
 
 /// Frames [begin, end) of a copy that land inside a buffer.
@@ -42,8 +46,8 @@ inline void addPairs(const EarBuffers& ears,
                      float gain) noexcept {
     const FrameRange range = framesInside(position, pairs.frames, ears.size);
     for (int i = range.begin; i < range.end; ++i) {
-        ears.left[position + i] += pairs.left[2 * i] * gain;
-        ears.right[position + i] += pairs.right[2 * i] * gain;
+        ears.left[position + i] += pairs.leftAt(i) * gain;
+        ears.right[position + i] += pairs.rightAt(i) * gain;
     }
 }
 
@@ -68,19 +72,19 @@ inline void addFilteredPairs(const EarBuffers& ears,
     Biquad rightFilter = filter;
     const FrameRange range = framesInside(position, pairs.frames, ears.size);
     for (int i = 0; i < range.begin; ++i) {
-        leftFilter.process(pairs.left[2 * i] * gain);
-        rightFilter.process(pairs.right[2 * i] * gain);
+        leftFilter.process(pairs.leftAt(i) * gain);
+        rightFilter.process(pairs.rightAt(i) * gain);
     }
     const int fadeBegin = std::clamp(pairs.frames - fade.frames, range.begin, range.end);
     for (int i = range.begin; i < fadeBegin; ++i) {
-        ears.left[position + i] += leftFilter.process(pairs.left[2 * i] * gain);
-        ears.right[position + i] += rightFilter.process(pairs.right[2 * i] * gain);
+        ears.left[position + i] += leftFilter.process(pairs.leftAt(i) * gain);
+        ears.right[position + i] += rightFilter.process(pairs.rightAt(i) * gain);
     }
     for (int i = fadeBegin; i < range.end; ++i) {
         const float weight =
             1.0f - static_cast<float>(i - pairs.frames + fade.frames + 1) * fade.step;
-        ears.left[position + i] += leftFilter.process(pairs.left[2 * i] * gain) * weight;
-        ears.right[position + i] += rightFilter.process(pairs.right[2 * i] * gain) * weight;
+        ears.left[position + i] += leftFilter.process(pairs.leftAt(i) * gain) * weight;
+        ears.right[position + i] += rightFilter.process(pairs.rightAt(i) * gain) * weight;
     }
 }
 

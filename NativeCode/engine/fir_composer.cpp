@@ -39,8 +39,8 @@ void writeDirect(const EarBuffers& ears,
                  float mixGain) noexcept {
     const FrameRange range = framesInside(0, pairs.frames, ears.size);
     for (int i = range.begin; i < range.end; ++i) {
-        ears.left[i] = pairs.left[2 * i] * lawGain * mixGain;
-        ears.right[i] = pairs.right[2 * i] * lawGain * mixGain;
+        ears.left[i] = pairs.leftAt(i) * lawGain * mixGain;
+        ears.right[i] = pairs.rightAt(i) * lawGain * mixGain;
     }
 }
 
@@ -73,8 +73,8 @@ void addFixed(const EarBuffers& ears,
     for (int i = range.begin; i < range.end; ++i) {
         float& left = ears.left[delay + i];
         float& right = ears.right[delay + i];
-        left = single(wide(left) + wide(pairs.left[2 * i]) * gain * wide(earlyGain));
-        right = single(wide(right) + wide(pairs.right[2 * i]) * gain * wide(earlyGain));
+        left = single(wide(left) + wide(pairs.leftAt(i)) * gain * wide(earlyGain));
+        right = single(wide(right) + wide(pairs.rightAt(i)) * gain * wide(earlyGain));
     }
 }
 

@@ -2,6 +2,7 @@
 #include "engine/input_front_end.h"
 
 #include <cmath>
+#include <cstddef>
 #include <cstring>
 
 #include "base/log.h"
@@ -81,7 +82,7 @@ void InputFrontEnd::process(const float* input,
         doppler.process(channel, inputGain, distance, distanceOld, block);
     } else {
         for (int i = 0; i < B; ++i) {
-            block[i] = channel[2 * i] * inputGain;
+            block[i] = channel[std::ptrdiff_t{2} * i] * inputGain;
         }
     }
 

@@ -6,6 +6,7 @@
 #include <algorithm>
 #include <array>
 #include <cmath>
+#include <cstddef>
 #include <limits>
 #include <memory>
 #include <random>
@@ -115,6 +116,7 @@ TEST(DopplerLine, SlowlyMovingSourceIsReadBetweenTwoSamples) {
     for (const int sampleRate : sampleRates) {
         for (const int block : {32, 256, 1024}) {
             std::vector<float> path;
+            path.reserve(40);
             for (int n = 0; n < 40; ++n) {
                 path.push_back(10.0f + 4.0f * std::sin(0.3f * static_cast<float>(n)));
             }
@@ -160,7 +162,7 @@ TEST(DopplerLine, ApproachRaisesThePitch) {
     int blocks = 0;
     double before = 0.0;
     for (int n = 0; n < 80; ++n) {
-        std::vector<float> input(2 * block);
+        std::vector<float> input(std::size_t{2} * block);
         for (int i = 0; i < block; ++i) {
             const double phase = 2.0 * 3.14159265358979 * 1000.0 * (n * block + i) / sampleRate;
             input[2 * static_cast<std::size_t>(i)] = static_cast<float>(std::sin(phase));

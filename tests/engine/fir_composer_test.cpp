@@ -6,11 +6,14 @@
 #include <algorithm>
 #include <array>
 #include <cmath>
+#include <cstddef>
 #include <cstdint>
 #include <limits>
 #include <memory>
+#include <string>
 #include <vector>
 
+#include "base/log.h"
 #include "engine/hrir_table_fixture.h"
 #include "support/log_capture.h"
 
@@ -263,6 +266,26 @@ TEST_F(FirComposerTest, FixedPairIsDroppedWhereItLeavesTheBuffer) {
     EXPECT_TRUE(silent(missing));
 }
 
+TEST_F(FirComposerTest, NoMoreIsReadThanTheTablesPromise) {
+    setSizes(1024, 256);
+    switches.hrirLength = 1000;
+    store(40, 20);
+    switches.qvEarlyReflections = true;
+    reflections.earlyRefFilter_1st = storeLoose();
+    reflections.earlyRefFilter_2nd = storeLoose();
+    reflections.earlyRefDelay_1st = 300;
+    reflections.earlyRefDelay_2nd = 600;
+    reflections.earlyRefLength_1st = 1000;
+    reflections.earlyRefLength_2nd = 32767;
+    Ears ears = compose();
+    EXPECT_NE(ears.at(0, 255), 0.0f);
+    EXPECT_EQ(ears.at(0, 256), 0.0f);
+    EXPECT_NE(ears.at(1, 300 + 255), 0.0f);
+    EXPECT_EQ(ears.at(1, 300 + 256), 0.0f);
+    EXPECT_NE(ears.at(0, 600 + 255), 0.0f);
+    EXPECT_EQ(ears.at(0, 600 + 256), 0.0f);
+}
+
 // ---- Preset reflections ----
 
 /// One record as it is defined, over a response.
@@ -374,6 +397,22 @@ TEST_F(FirComposerTest, RecordThatReachesTheEndIsRejected) {
     }
 }
 
+TEST_F(FirComposerTest, OnlyFilteredRecordsTraceTheirRejection) {
+    addRecord(1024 - 128, -1);
+    addRecord(1000, 1);
+    addRecord(-200, 0);
+    const LogCapture log;
+    compose();
+    const std::string first =
+        "ERROR: FIR-size 1024 too small for 1256 this reflection no 1!!!! (not processed) or delay "
+        "< 0";
+    const std::string second =
+        "ERROR: FIR-size 1024 too small for 56 this reflection no 2!!!! (not processed) or delay "
+        "< 0";
+    const std::vector<std::string> traced = {first, second};
+    EXPECT_EQ(log.outputLines(), traceEnabled ? traced : std::vector<std::string>{});
+}
+
 TEST_F(FirComposerTest, WrappedDelaysDropWhatLiesBeforeTheResponse) {
     for (const int filterClass : {-1, 0}) {
         for (const int delay : {-1, -60, -126, -128, -129, -20000, -32768}) {
@@ -454,7 +493,7 @@ TEST_F(TailTest, MeasuredTailTakesThreeGains) {
     const float g = 0.5f * 0.4f * 0.8f;
     EXPECT_EQ(composer.reverbMixGain, 0.4f);
     for (int i = 0; i < ears.size; ++i) {
-        const auto k = static_cast<std::size_t>(2 * i);
+        const auto k = 2 * static_cast<std::size_t>(i);
         EXPECT_EQ(ears.at(0, i), i < 4000 ? tail.reverbIR[k] * g : 0.0f);
         EXPECT_EQ(ears.at(1, i), i < 4000 ? tail.reverbIR[k + 1] * g : 0.0f);
     }

@@ -28,9 +28,10 @@ protected:
 
     /// An entry that no cell of the table leads to.
     HrirSlot storeLoose() {
+        constexpr std::size_t pairFloats = std::size_t{2} * hrirMaxLength;
         std::uniform_real_distribution<float> noise(-0.5f, 0.5f);
-        auto& pairs = entries_.emplace_back(std::make_unique<float[]>(2 * hrirMaxLength));
-        for (std::size_t i = 0; i < 2 * hrirMaxLength; ++i) {
+        auto& pairs = entries_.emplace_back(std::make_unique<float[]>(pairFloats));
+        for (std::size_t i = 0; i < pairFloats; ++i) {
             pairs[i] = noise(random_);
         }
         return slots_.emplace_back(std::make_unique<float*>(pairs.get())).get();

@@ -39,7 +39,7 @@ ReverbTail tailOf(int frames, unsigned seed = 21) {
 }
 
 float tailFrame(const ReverbTail& tail, int ear, int i) {
-    return tail.reverbIR[static_cast<std::size_t>(2 * i + ear)];
+    return tail.reverbIR[2 * static_cast<std::size_t>(i) + static_cast<std::size_t>(ear)];
 }
 
 TEST(ReverbTailAdd, UnfilteredAddsEvenValuesLeftAndOddValuesRight) {

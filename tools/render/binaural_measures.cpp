@@ -10,10 +10,10 @@ namespace tessaly {
 
 namespace {
 
-constexpr double windowSeconds = 0.04;
+constexpr double windowSeconds = 0.06;
 constexpr double bandLow = 500.0;    // Hz; the time difference is steady in this band and the
 constexpr double bandHigh = 3000.0;  // fine structure of one cycle does not mislead
-constexpr double gateDb = 40.0;      // below the loudest window: no differences
+constexpr double gateDb = 25.0;      // below the loudest window: no differences
 constexpr double leastCorrelation =
     0.4;  // of the two ears, normalised; below it no time difference
 
@@ -71,6 +71,13 @@ Ears bandLimited(std::span<const float> stereo, double rate) {
     return ears;
 }
 
+// Raised cosine over a window: what lies in its middle decides, not a burst that just ended at its
+// edge.
+double windowWeight(std::ptrdiff_t index, std::ptrdiff_t begin, std::ptrdiff_t end) {
+    const double x = (static_cast<double>(index - begin) + 0.5) / static_cast<double>(end - begin);
+    return 0.5 - 0.5 * std::cos(2.0 * std::numbers::pi * x);
+}
+
 // Window [begin, end) of the right ear against the left one shifted by up to the longest lag.
 std::optional<double> timeDifference(const Ears& ears,
                                      std::ptrdiff_t begin,
@@ -79,13 +86,11 @@ std::optional<double> timeDifference(const Ears& ears,
     const auto frames = static_cast<std::ptrdiff_t>(ears.left.size());
     const auto longest =
         static_cast<std::ptrdiff_t>(std::ceil(longestTimeDifference * 0.001 * rate));
-    const auto length = static_cast<double>(end - begin);
     std::vector<double> correlation(static_cast<std::size_t>(2 * longest + 1));
     std::vector<double> leftEnergy(correlation.size());
     double rightEnergy = 0.0;
     for (std::ptrdiff_t i = std::max<std::ptrdiff_t>(begin, 0); i < std::min(end, frames); ++i) {
-        const double x = (static_cast<double>(i - begin) + 0.5) / length;
-        const double weight = 0.5 - 0.5 * std::cos(2.0 * std::numbers::pi * x);
+        const double weight = windowWeight(i, begin, end);
         const double right = weight * ears.right[i];
         rightEnergy += right * ears.right[i];
         const std::ptrdiff_t first = std::max(-longest, -i);
@@ -139,16 +144,19 @@ std::vector<BinauralPoint> measureBinaural(std::span<const float> stereo,
         if (middle >= frames) {
             break;
         }
-        const std::ptrdiff_t begin = std::max<std::ptrdiff_t>(middle - half, 0);
-        const std::ptrdiff_t end = std::min(middle + half, frames);
         std::array<double, 2> sums{};
-        for (std::ptrdiff_t i = 2 * begin; i < 2 * end; ++i) {
-            const auto sample = static_cast<double>(stereo[i]);
-            sums[i % 2] += sample * sample;
+        double weights = 0.0;
+        for (std::ptrdiff_t i = std::max<std::ptrdiff_t>(middle - half, 0);
+             i < std::min(middle + half, frames); ++i) {
+            const double weight = windowWeight(i, middle - half, middle + half);
+            for (std::ptrdiff_t ear = 0; ear < 2; ++ear) {
+                const auto sample = static_cast<double>(stereo[2 * i + ear]);
+                sums[ear] += weight * sample * sample;
+            }
+            weights += weight;
         }
-        const auto count = static_cast<double>(std::max<std::ptrdiff_t>(end - begin, 1));
-        point.leftDb = decibels(sums[0] / count);
-        point.rightDb = decibels(sums[1] / count);
+        point.leftDb = decibels(sums[0] / weights);
+        point.rightDb = decibels(sums[1] / weights);
         loudest = std::max({loudest, point.leftDb, point.rightDb});
         points.push_back(point);
     }

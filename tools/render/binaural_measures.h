@@ -30,8 +30,8 @@ inline constexpr double longestTimeDifference = 1.0;
 /// @returns milliseconds, or nothing if the ears are silent or too unlike for an answer
 std::optional<double> interauralTime(std::span<const float> stereo, double sampleRate);
 
-/// Measures in windows of 40 ms. Windows quieter than the loudest by more than 40 dB have no
-/// differences.
+/// Measures in raised-cosine windows of 60 ms. Windows quieter than the loudest by more than 25 dB
+/// have no differences.
 /// @param hopSeconds  distance of the windows' middles
 std::vector<BinauralPoint> measureBinaural(std::span<const float> stereo,
                                            double sampleRate,
