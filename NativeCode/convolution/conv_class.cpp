@@ -160,7 +160,7 @@ convClass::convClass(std::string instanceNameIn,
     timePartsR.resize(count);
     carveTimeParts(timePartsL, timeMemoryL_, window);
     carveTimeParts(timePartsR, timeMemoryR_, window);
-    fftOrder = fftLength > 0 ? std::bit_width(static_cast<std::uint32_t>(fftLength)) - 1 : 0;
+    fftOrder = fftLength > 0 ? 31 - std::countl_zero(static_cast<std::uint32_t>(fftLength)) : 0;
 
     FDL.resize(count);
     FDLown.resize(count);

@@ -36,6 +36,8 @@ void resetConvolutionState() noexcept;
 /// With a second instance the engine lets it borrow `filterPartsL`, `filterPartsR`,
 /// `hpTFspectrumL` and `hpTFspectrumR` of the first one, entry by entry; it neither writes nor
 /// releases them, and does not run after the first one is gone.
+// The fields keep their known order, whatever padding that costs.
+// NOLINTNEXTLINE(clang-analyzer-optin.performance.Padding)
 class convClass {
 public:
     /// Load time: allocates. `essError` becomes -201 without a transform plan, -202 without memory

@@ -44,7 +44,9 @@ struct TransformPlan {
     bool committed = false;
 };
 
-void TransformPlanDeleter::operator()(TransformPlan* plan) const noexcept { delete plan; }
+void TransformPlanDeleter::operator()(TransformPlan* plan) const noexcept {
+    std::default_delete<TransformPlan>{}(plan);
+}
 
 const char* transformMessage(std::int32_t status) noexcept {
     switch (status) {
@@ -77,7 +79,7 @@ std::int32_t createTransform(TransformHandle& handle, std::int32_t length) noexc
         return transformNoMemory;
     }
     try {
-        handle.reset(new TransformPlan(length));
+        handle.reset(std::make_unique<TransformPlan>(length).release());
     } catch (const std::bad_alloc&) {
         return transformNoMemory;
     }

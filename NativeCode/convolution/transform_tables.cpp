@@ -82,7 +82,7 @@ private:
                     out[lane] = single(root.re);
                     out[tables_.lanes + lane] = single(root.im);
                 }
-                out += 2 * tables_.lanes;
+                out += std::ptrdiff_t{2} * tables_.lanes;
             }
         }
     }
@@ -95,7 +95,7 @@ private:
                 out[lane] = single(0.5 * root.im);
                 out[tables_.lanes + lane] = single(-0.5 * root.re);
             }
-            out += 2 * tables_.lanes;
+            out += std::ptrdiff_t{2} * tables_.lanes;
         }
     }
 

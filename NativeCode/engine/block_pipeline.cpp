@@ -195,6 +195,9 @@ void processEngineBlock(EngineState& state, float*& input, float*& output) {
     composeResponse(state);
     state.frontEnd.process(state.inBlock, state.inputChannel, state.controls.bassBoost,
                            state.switches.doppler, state.law.distance, state.law.distanceOld);
+    if (state.switches.doppler) {
+        state.law.dopplerPitch = 1.0f;  // the delay line has done the shift
+    }
     advanceRings(state);
     convolve(state);
     filterChangeAll = false;

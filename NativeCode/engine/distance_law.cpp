@@ -27,7 +27,7 @@ constexpr float nearOffset = 0.4f;
 constexpr float nearBias = 0.22f;
 
 constexpr double reverbRange = 13.7;                    // metres without a loss in the tail
-constexpr double perReverbRange = 0.07299270092702692;  // 1/m, near 1 / 13.7 but not that quotient
+constexpr double perReverbRange = 0.07299270072992702;  // 1/m, 1 / 13.7
 constexpr double reverbFadeStart = 30.0;                // metres
 constexpr double perReverbFade = 0.1;                   // 1/m: silent from 40 m on
 

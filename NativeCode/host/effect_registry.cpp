@@ -136,7 +136,7 @@ int getFloatParameter(std::span<const float> values,
                       int index,
                       float* value,
                       char* valuestr) noexcept {
-    if (index < 0 || static_cast<std::size_t>(index) >= values.size()) {
+    if (static_cast<std::size_t>(index) >= values.size()) {  // a negative one wraps above it
         return callbackUnsupported;
     }
     if (value != nullptr) {

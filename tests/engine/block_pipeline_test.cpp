@@ -286,6 +286,17 @@ TEST_F(BlockPipeline, ImpulseComesOutAsTheComposedResponse) {
     }
 }
 
+TEST_F(BlockPipeline, TheDelayLineSettlesThePitch) {
+    EngineRig rig(directory.path(), 48000, 256);
+    rig.settings.doppler = 1;
+    rig.build();
+    for (const float distance : {1.0f, 1.3f, 9.0f}) {
+        rig.distance = distance;
+        rig.run();
+        EXPECT_EQ(rig.state().law.dopplerPitch, 1.0f) << distance;
+    }
+}
+
 TEST_F(BlockPipeline, ExtremeControlsNeverLeaveTheBuffers) {
     EngineRig rig(directory.path(), 48000, 64);
     rig.settings.doppler = 1;

@@ -347,12 +347,13 @@ TEST_F(BlockEntryTest, ManyChannelsAreReadAsTwo) {
 
 TEST_F(BlockEntryTest, NoInputIsSilence) {
     run(counted(2 * frames), 2);
-    const std::vector<float> none;
+    const std::vector<float> one(1, 7.0f);
+    const float* none = one.data() + one.size();  // not null, and nothing to read there
     std::vector<float> out(2 * frames, 9.0f);
     for (const float channel : {-1.0f, 0.0f}) {
         for (const int inchannels : {0, -2}) {
             handler.inputChannel = channel;
-            handler.processBlock(none.data(), out.data(), frames, inchannels, 2);
+            handler.processBlock(none, out.data(), frames, inchannels, 2);
             EXPECT_EQ(fakeEngines().last().blocks.back().input,
                       std::vector<float>(2 * frames, 0.0f));
             run(counted(2 * frames), 2);
@@ -426,6 +427,18 @@ TEST_F(BlockEntryTest, OtherOutputCountsAreReportedAndCopiedFlat) {
     handler.processBlock(in.data(), untouched.data(), frames, 2, 0);
     handler.processBlock(in.data(), untouched.data(), frames, 2, -4);
     EXPECT_EQ(untouched, std::vector<float>(4, 9.0f));
+}
+
+TEST_F(BlockEntryTest, AFlatCopyOfTheInputEndsWithInputAndBlock) {
+    handler.inputChannel = -1.0f;
+    // Six outputs ask for 24 floats of a short stereo input that has 8 ...
+    const std::vector<float> shortIn(8, 2.0f);
+    run(shortIn, 2, 6, 4);
+    EXPECT_EQ(fakeEngines().last().blocks.back().input[7], 2.0f);
+    EXPECT_EQ(fakeEngines().last().blocks.back().input[8], 0.0f);
+    // ... and for 48 of a block that holds 16.
+    run(counted(6 * frames), 6, 6);
+    EXPECT_EQ(fakeEngines().last().blocks.back().input, counted(2 * frames));
 }
 
 TEST_F(BlockEntryTest, AnEmptySlotLeavesTheOutputAndSaysSo) {

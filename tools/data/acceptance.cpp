@@ -174,8 +174,8 @@ private:
         if (expectations_.target != nullptr) {
             add("ITD less its target: max us", {micro * offTarget}, {within(5.0)}, 1);
         }
-        const double side = itd[static_cast<std::size_t>(packedIndex(90, 0))];
-        add("ITD at phi 90; largest step to a 5-degree neighbour, us", {micro * side, micro * step},
+        add("ITD at phi 90; largest step to a 5-degree neighbour, us",
+            {micro * analysis_.sideItdSeconds, micro * step},
             {expectations_.reference ? Range{640.0, 690.0} : above(0.0), ifReference(within(60.0))},
             1);
     }

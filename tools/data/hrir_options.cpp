@@ -93,4 +93,13 @@ const RateEntry& rateEntry(int sampleRate) {
     throw DataError("unknown rate {} Hz, expected 44100, 48000 or 24000", sampleRate);
 }
 
+int rateFromText(const std::string& text) {
+    for (const RateEntry& entry : rateTable()) {
+        if (fmt::to_string(entry.sampleRate) == text) {
+            return entry.sampleRate;
+        }
+    }
+    throw DataError("unknown rate \"{}\", expected 44100, 48000 or 24000", text);
+}
+
 }  // namespace tessaly::data

@@ -44,6 +44,9 @@ const std::vector<RateEntry>& rateTable();
 /// @throws DataError for a rate the engine does not know
 const RateEntry& rateEntry(int sampleRate);
 
+/// @throws DataError for text that is no rate of the engine
+int rateFromText(const std::string& text);
+
 inline constexpr int fewestHrirTaps = 32;
 inline constexpr int mostHrirTaps = 256;
 

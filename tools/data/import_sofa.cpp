@@ -144,21 +144,18 @@ bool isHdf5(const std::filesystem::path& path) {
     return file.read(start, sizeof(start)) && std::memcmp(start, "\x89HDF", sizeof(start)) == 0;
 }
 
-Measurement importSofa(const std::filesystem::path& path) {
-    const SofaFile file = open(path);
-    const std::string name = path.filename().string();
-    checkShape(*file, name);
-
-    const std::string type = attribute(file->SourcePosition.attributes, "Type");
+Measurement convertSofa(const MYSOFA_HRTF& file, const std::string& name) {
+    checkShape(file, name);
+    const std::string type = attribute(file.SourcePosition.attributes, "Type");
     if (type != "spherical" && type != "cartesian") {
         throw DataError("{} has source positions of type \"{}\", expected spherical or cartesian",
                         name, type);
     }
     std::vector<Direction> directions;
     std::vector<double> distances;
-    for (std::size_t m = 0; m < file->M; ++m) {
+    for (std::size_t m = 0; m < file.M; ++m) {
         const auto [direction, distance] =
-            position(file->SourcePosition.values + 3 * m, type == "cartesian");
+            position(file.SourcePosition.values + 3 * m, type == "cartesian");
         if (!std::isfinite(distance)) {
             throw DataError("{}: direction {} has a distance that is not a number", name, m);
         }
@@ -167,23 +164,28 @@ Measurement importSofa(const std::filesystem::path& path) {
     }
 
     Measurement measurement;
-    measurement.sampleRate = static_cast<double>(file->DataSamplingRate.values[0]);
-    measurement.taps = file->N;
+    measurement.sampleRate = static_cast<double>(file.DataSamplingRate.values[0]);
+    measurement.taps = file.N;
     const std::size_t delayRows =
-        file->DataDelay.values != nullptr ? file->DataDelay.elements / earCount : 0;
+        file.DataDelay.values != nullptr ? file.DataDelay.elements / earCount : 0;
     for (const std::size_t m : nearestDistanceGroup(distances)) {
         measurement.directions.push_back(directions[m]);
-        const float* first = file->DataIR.values + m * earCount * file->N;
+        const float* first = file.DataIR.values + m * earCount * file.N;
         measurement.samples.insert(measurement.samples.end(), first,
-                                   first + std::size_t{earCount} * file->N);
+                                   first + std::size_t{earCount} * file.N);
         double extra = 0.0;
         if (delayRows > 0) {
-            const float* delay = file->DataDelay.values + (delayRows == 1 ? 0 : m) * earCount;
+            const float* delay = file.DataDelay.values + (delayRows == 1 ? 0 : m) * earCount;
             extra = static_cast<double>(delay[rightEar]) - static_cast<double>(delay[leftEar]);
         }
         measurement.extraSeconds.push_back(extra / measurement.sampleRate);
     }
+    return measurement;
+}
 
+Measurement importSofa(const std::filesystem::path& path) {
+    const SofaFile file = open(path);
+    Measurement measurement = convertSofa(*file, path.filename().string());
     measurement.provenance.path = std::filesystem::absolute(path);
     measurement.provenance.sha256 = sha256OfFile(path);
     if (measurement.provenance.sha256 == kemarSha256) {

@@ -5,6 +5,8 @@
 
 #include "data/measurement.h"
 
+struct MYSOFA_HRTF;
+
 namespace tessaly::data {
 
 /// The measured KEMAR set of the libmysofa package: the default source.
@@ -17,6 +19,11 @@ inline constexpr const char* kemarSha256 =
 /// @return a set that has not been checked yet: `checkMeasurement`
 /// @throws DataError for a file that is missing, no SOFA file, or of another convention or shape
 Measurement importSofa(const std::filesystem::path& path);
+
+/// The loaded form of a file to a set without provenance.
+/// @param name  for messages
+/// @throws DataError for another convention, or counts that do not fit each other
+Measurement convertSofa(const MYSOFA_HRTF& file, const std::string& name);
 
 /// True if the file begins as HDF5 files do, which SOFA files are.
 bool isHdf5(const std::filesystem::path& path);

@@ -12,11 +12,16 @@ namespace {
 
 using namespace tessaly::data;
 
-void addHrirCommand(CLI::App& application, HrirCommand& command, std::string& symmetry) {
+/// What the command line gives as words.
+struct HrirWords {
+    std::vector<std::string> rates = {"44100", "48000", "24000"};
+    std::string symmetry = "auto";
+};
+
+void addHrirCommand(CLI::App& application, HrirCommand& command, HrirWords& words) {
     CLI::App* hrir = application.add_subcommand(
         "hrir", "Build the packed HRIR files TSLdata120.dat (44100 Hz), 121 (48000), 122 (24000)");
     command.source.sofa = defaultSofaPath;
-    command.rates = {44100, 48000, 24000};
     CLI::Option* sofa =
         hrir->add_option("--sofa", command.source.sofa, "measured set, SOFA SimpleFreeFieldHRIR")
             ->capture_default_str();
@@ -25,12 +30,12 @@ void addHrirCommand(CLI::App& application, HrirCommand& command, std::string& sy
                      "lines: file azimuth_ccw elevation")
         ->excludes(sofa);
     hrir->add_option("--out", command.directory, "directory to write into")->required();
-    hrir->add_option("--rates", command.rates, "sample rates; 44100 is always built")
+    hrir->add_option("--rates", words.rates, "sample rates; 44100 is always built")
         ->delimiter(',')
         ->capture_default_str();
     hrir->add_flag("!--no-dfeq", command.options.diffuseFieldEqualisation,
                    "leave loudspeaker and ear canal in: no diffuse-field equalisation");
-    hrir->add_option("--symmetry", symmetry,
+    hrir->add_option("--symmetry", words.symmetry,
                      "average left and right: auto (if they differ by less than 1 dB), on, off")
         ->capture_default_str();
     hrir->add_option("--taps", command.options.taps,
@@ -48,8 +53,8 @@ int run(int argumentCount, char** arguments) {
     application.set_version_flag("--version", TESSALY_VERSION_TEXT);
 
     HrirCommand hrir;
-    std::string symmetry = "auto";
-    addHrirCommand(application, hrir, symmetry);
+    HrirWords words;
+    addHrirCommand(application, hrir, words);
 
     std::filesystem::path directory;
     std::filesystem::path sofa;
@@ -62,7 +67,10 @@ int run(int argumentCount, char** arguments) {
     if (verify->parsed()) {
         return runVerify(directory, sofa) ? 0 : 1;
     }
-    hrir.options.symmetry = symmetryFromText(symmetry);
+    hrir.options.symmetry = symmetryFromText(words.symmetry);
+    for (const std::string& rate : words.rates) {
+        hrir.rates.push_back(rateFromText(rate));
+    }
     runHrir(hrir);
     return 0;
 }

@@ -16,6 +16,7 @@ constexpr std::size_t analysisLength = 4096;
 constexpr double smallestMagnitude = 1e-10;
 constexpr double onsetShare = 0.1;  // of the largest sample: -20 dB
 constexpr double onsetLeadSeconds = 0.1e-3;
+constexpr double wideSearchSeconds = 1e-3;
 constexpr double noEnergyDecibels = -200.0;
 
 double decibelsOf(double share) {
@@ -145,6 +146,12 @@ SetAnalysis analyseSet(const HrirSet& set, Progress& progress) {
                                           .value_or(expected + itdSearchSeconds));
         progress.step();
     }
+    const auto side = static_cast<std::size_t>(packedIndex(90, 0));
+    analysis.sideItdSeconds =
+        estimator
+            .estimate(set.response(side, leftEar).data(), set.response(side, rightEar).data(), 0.0,
+                      wideSearchSeconds)
+            .value_or(0.0);
     analysis.preOnsetDecibels = decibelsOf(beforeOnsets / allEnergy);
     mirrorCheck(set, analysis);
     return analysis;

@@ -21,8 +21,9 @@ Spread spreadOf(std::vector<double> values);
 
 /// What all figures of a set are worked out from.
 struct SetAnalysis {
-    LevelCurves levels;                         ///< transform of 4096
-    std::vector<double> itdSeconds;             ///< excess-phase estimate
+    LevelCurves levels;              ///< transform of 4096
+    std::vector<double> itdSeconds;  ///< excess-phase estimate
+    double sideItdSeconds = 0.0;     ///< at phi 90, searched 1 ms either way: shows swapped ears
     std::vector<std::vector<double>> energies;  ///< an ear: sum of squares of each direction
     double preOnsetDecibels = 0.0;              ///< energy before the onsets, of all energy
     double worstPreOnsetDecibels = 0.0;         ///< the same of the worst response

@@ -16,8 +16,6 @@
 
 #include "demo_sounds/demo_sounds.h"
 
-extern char** environ;
-
 namespace tessaly {
 
 namespace {
@@ -56,7 +54,7 @@ bool runSilently(std::vector<std::string> words) {
         arguments.push_back(word.data());
     }
     arguments.push_back(nullptr);
-    posix_spawn_file_actions_t actions;
+    posix_spawn_file_actions_t actions{};
     posix_spawn_file_actions_init(&actions);
     posix_spawn_file_actions_addopen(&actions, STDOUT_FILENO, "/dev/null", O_WRONLY, 0);
     posix_spawn_file_actions_addopen(&actions, STDERR_FILENO, "/dev/null", O_WRONLY, 0);

@@ -40,9 +40,10 @@ void noteRelease() noexcept {
 
 #if TESSALY_COUNT_BY_HOOKS
 
-extern "C" int __sanitizer_install_malloc_and_free_hooks(void (*mallocHook)(const volatile void*,
-                                                                            std::size_t),
-                                                         void (*freeHook)(const volatile void*));
+// NOLINTNEXTLINE(bugprone-reserved-identifier): the sanitizer's name
+extern "C" int __sanitizer_install_malloc_and_free_hooks(
+    void (*mallocHook)(const volatile void*, std::size_t),
+    void (*freeHook)(const volatile void*)) noexcept;
 
 namespace {
 
@@ -66,6 +67,7 @@ void onFree(const volatile void* memory) {
 #else
 
 // The C library's own entries under the names it keeps for replacements of the malloc family.
+// NOLINTBEGIN(bugprone-reserved-identifier)
 extern "C" {
 void* __libc_malloc(std::size_t size);
 void* __libc_calloc(std::size_t count, std::size_t size);
@@ -73,6 +75,7 @@ void* __libc_realloc(void* memory, std::size_t size);
 void* __libc_memalign(std::size_t alignment, std::size_t size);
 void __libc_free(void* memory);
 }
+// NOLINTEND(bugprone-reserved-identifier)
 
 namespace {
 

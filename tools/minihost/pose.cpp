@@ -2,6 +2,7 @@
 #include "minihost/pose.h"
 
 #include <cmath>
+#include <cstddef>
 #include <numbers>
 
 namespace tessaly {
@@ -48,7 +49,7 @@ Matrix4 worldToLocal(const Pose& pose) {
     const Axes axes = axesOf(pose);
     const Vector3& p = pose.position;
     Matrix4 matrix{};
-    int row = 0;
+    std::size_t row = 0;
     for (const Vector3* axis : {&axes.right, &axes.up, &axes.forward}) {
         matrix[row] = narrow(axis->x);
         matrix[row + 4] = narrow(axis->y);
@@ -63,7 +64,7 @@ Matrix4 worldToLocal(const Pose& pose) {
 Matrix4 localToWorld(const Pose& pose) {
     const Axes axes = axesOf(pose);
     Matrix4 matrix{};
-    int column = 0;
+    std::size_t column = 0;
     for (const Vector3* axis : {&axes.right, &axes.up, &axes.forward, &pose.position}) {
         matrix[4 * column] = narrow(axis->x);
         matrix[4 * column + 1] = narrow(axis->y);

@@ -17,10 +17,23 @@
 #endif
 
 #if defined(TESSALY_SANITIZER_REPORTS)
+// NOLINTNEXTLINE(bugprone-reserved-identifier): the sanitizer's name
 extern "C" void __sanitizer_set_report_fd(void* descriptor);
 #endif
 
 namespace tessaly {
+
+#if defined(TESSALY_SANITIZER_REPORTS)
+namespace {
+
+// The sanitizer takes a file descriptor in the shape of a pointer.
+void sendReportsTo(int descriptor) {
+    // NOLINTNEXTLINE(performance-no-int-to-ptr)
+    __sanitizer_set_report_fd(reinterpret_cast<void*>(static_cast<std::intptr_t>(descriptor)));
+}
+
+}  // namespace
+#endif
 
 LibraryLog::LibraryLog(bool verbose) : own(STDERR_FILENO) {
     if (verbose) {
@@ -37,7 +50,7 @@ LibraryLog::LibraryLog(bool verbose) : own(STDERR_FILENO) {
     }
     own = copy;
 #if defined(TESSALY_SANITIZER_REPORTS)
-    __sanitizer_set_report_fd(reinterpret_cast<void*>(static_cast<std::intptr_t>(own)));
+    sendReportsTo(own);
 #endif
 }
 
@@ -46,7 +59,7 @@ LibraryLog::~LibraryLog() {
         std::fflush(stderr);
         dup2(own, STDERR_FILENO);
 #if defined(TESSALY_SANITIZER_REPORTS)
-        __sanitizer_set_report_fd(reinterpret_cast<void*>(std::intptr_t{STDERR_FILENO}));
+        sendReportsTo(STDERR_FILENO);
 #endif
         close(own);
         close(kept);

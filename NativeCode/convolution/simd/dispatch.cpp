@@ -42,14 +42,13 @@ CpuFeatures readCpuFeatures() noexcept {
 
 KernelList listKernels() noexcept {
     const CpuFeatures features = readCpuFeatures();
-    KernelList list{};
+    KernelList list{{kernelsScalar}, 1};
     const auto offer = [&list](const Kernels* kernels, bool supported) {
         if (kernels != nullptr && supported) {
             list.tables[list.count] = kernels;
             ++list.count;
         }
     };
-    offer(kernelsScalar, true);
     offer(kernelsNeon, true);
     offer(kernelsSse2, features.sse2);
     offer(kernelsAvx2, features.avx2AndFma);

@@ -187,7 +187,7 @@ struct SampleSource {
     const float* samples;
 
     TESSALY_KERNEL_INLINE Complex<Lanes> operator()(Index j) const {
-        Complex<Lanes> value;
+        Complex<Lanes> value{};
         Lanes::loadInterleaved(samples + 2 * Lanes::count * j, value.re, value.im);
         return value;
     }
@@ -211,8 +211,8 @@ struct BinSource {
     const float* bins;
     const float* split;
     Index points;
-    float first[2 * count];  // bins 0 .. L - 1 and M - L + 1 .. M without the imaginary parts of
-    float last[2 * count];   // bins 0 and M
+    float first[2 * count]{};  // bins 0 .. L - 1 and M - L + 1 .. M without the imaginary parts of
+    float last[2 * count]{};   // bins 0 and M
 
     BinSource(const TransformTables& tables, const ComplexBin* source)
         : bins(floats(source)), split(tables.split), points(tables.points) {
@@ -227,8 +227,8 @@ struct BinSource {
     TESSALY_KERNEL_INLINE Complex<Lanes> operator()(Index j) const {
         const float* near = j == 0 ? first : bins + 2 * count * j;
         const float* far = j == 0 ? last : bins + 2 * (points - count * j - (count - 1));
-        Complex<Lanes> x;
-        Complex<Lanes> mirrored;
+        Complex<Lanes> x{};
+        Complex<Lanes> mirrored{};
         Lanes::loadInterleaved(near, x.re, x.im);
         Lanes::loadInterleaved(far, mirrored.re, mirrored.im);
         mirrored.re = Lanes::reverse(mirrored.re);

@@ -3,6 +3,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <map>
 #include <numbers>
 
 namespace tessaly::reference {
@@ -12,6 +13,18 @@ namespace {
 /// Written out: the library operator also looks for infinities.
 std::complex<double> product(std::complex<double> a, std::complex<double> b) {
     return {a.real() * b.real() - a.imag() * b.imag(), a.real() * b.imag() + a.imag() * b.real()};
+}
+
+/// e^(-2 pi i k / n) for k below n / 2, worked out once a length.
+const Pairs& turnsOf(std::size_t n) {
+    static std::map<std::size_t, Pairs> tables;
+    Pairs& turns = tables[n];
+    for (std::size_t k = turns.size(); k < n / 2; ++k) {
+        const double angle =
+            -2.0 * std::numbers::pi * static_cast<double>(k) / static_cast<double>(n);
+        turns.push_back({std::cos(angle), std::sin(angle)});
+    }
+    return turns;
 }
 
 }  // namespace
@@ -28,19 +41,14 @@ void fourier(std::vector<std::complex<double>>& values, bool backward) {
             std::swap(values[i], values[j]);
         }
     }
-    std::vector<std::complex<double>> turns(std::max<std::size_t>(n / 2, 1));
-    const double direction = backward ? 1.0 : -1.0;
-    for (std::size_t k = 0; k < n / 2; ++k) {
-        const double angle =
-            direction * 2.0 * std::numbers::pi * static_cast<double>(k) / static_cast<double>(n);
-        turns[k] = {std::cos(angle), std::sin(angle)};
-    }
+    const Pairs& turns = turnsOf(n);
     for (std::size_t length = 2; length <= n; length *= 2) {
         const std::size_t step = n / length;
         for (std::size_t start = 0; start < n; start += length) {
             for (std::size_t k = 0; k < length / 2; ++k) {
-                const std::complex<double> odd =
-                    product(values[start + k + length / 2], turns[k * step]);
+                const std::complex<double> turn =
+                    backward ? std::conj(turns[k * step]) : turns[k * step];
+                const std::complex<double> odd = product(values[start + k + length / 2], turn);
                 const std::complex<double> even = values[start + k];
                 values[start + k] = even + odd;
                 values[start + k + length / 2] = even - odd;

@@ -282,6 +282,7 @@ void Engine::writeOutput(std::vector<double>& output) {
             }
         }
     }
+    holdInterpPair_ = false;  // a hold lasts one block
 }
 
 }  // namespace tessaly::reference

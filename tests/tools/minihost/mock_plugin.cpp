@@ -84,11 +84,10 @@ int onGet(UnityAudioEffectState* state, int index, float* value, char* text) {
 
 void breakARule(Misbehaviour rule) {
     if (rule == Allocates) {
+        // Handing the addresses on keeps the compiler from removing the pair.
         const std::vector<float> needless(1000);
         const std::string text(100 + needless.size(), 'x');
-        if (text.size() == 7) {
-            std::puts(text.c_str());
-        }
+        asm volatile("" : : "g"(needless.data()), "g"(text.data()) : "memory");
     }
     if (rule == Fails) {
         errorState = -105;
@@ -113,8 +112,9 @@ int onProcess(
         side = listener[0] * source[12] + listener[4] * source[13] + listener[8] * source[14] +
                listener[12];
     }
-    for (unsigned int i = 0; i < length; ++i) {
-        const float near = in[i * static_cast<unsigned int>(channels)] * gain;
+    const auto stride = static_cast<std::size_t>(channels);
+    for (std::size_t i = 0; i < length; ++i) {
+        const float near = in[i * stride] * gain;
         float& cell = instance.farEar[instance.farPosition];
         const float far = 0.25f * cell;
         cell = near;

@@ -8,8 +8,6 @@
 
 #include <cstdio>
 
-extern char** environ;
-
 namespace tessaly {
 
 namespace {
@@ -36,7 +34,7 @@ ProgramRun runProgram(const std::string& program, const std::vector<std::string>
 
     std::FILE* output = std::tmpfile();
     std::FILE* errors = std::tmpfile();
-    posix_spawn_file_actions_t actions;
+    posix_spawn_file_actions_t actions{};
     posix_spawn_file_actions_init(&actions);
     posix_spawn_file_actions_adddup2(&actions, fileno(output), STDOUT_FILENO);
     posix_spawn_file_actions_adddup2(&actions, fileno(errors), STDERR_FILENO);
