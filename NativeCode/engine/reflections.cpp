@@ -18,9 +18,7 @@ constexpr std::int16_t fixedPhi1st = -90;   // degrees
 constexpr std::int16_t fixedPhi2nd = 85;    // degrees
 constexpr std::int16_t fixedTheta = 0;      // degrees
 constexpr int headphoneFilterFrames = 256;  // the headphone filter lengthens a response by these
-constexpr int firstMetricPreset = 13;       // from here gains follow the path length
 constexpr double recordGain = 0.55;         // on every preset gain
-constexpr std::int16_t steepestTheta = 75;  // degrees, of a reflection
 
 /// Samples by which a delay must shrink so that a whole HRIR ends with the response.
 std::int32_t offsetOf(const Reflections::LoadContext& context, int delay) noexcept {
@@ -144,11 +142,7 @@ void Reflections::makeRecords(const LoadContext& context, const RoomPreset& pres
 
 void Reflections::loadRecordHrir(const LoadContext& context, ReflectionRecord& record) {
     const HrirRequest& request = context.request;
-    if (record.phi <= -180) {
-        record.phi = wrapToInt16(record.phi + 360);
-    } else if (record.phi > 180) {
-        record.phi = wrapToInt16(record.phi - 360);
-    }
+    record.phi = wrapToInt16(turnedRound(record.phi));
     record.indexPhi = phiToIndex(record.phi);
     record.theta = std::clamp<std::int16_t>(record.theta, -steepestTheta, steepestTheta);
     record.indexTheta = thetaToIndex(record.theta);

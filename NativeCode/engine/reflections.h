@@ -14,6 +14,16 @@ namespace tessaly {
 
 struct RoomPreset;
 
+/// From this preset on gains follow the path length.
+inline constexpr int firstMetricPreset = 13;
+/// Steepest elevation of a reflection, degrees.
+inline constexpr std::int16_t steepestTheta = 75;
+
+/// An azimuth of up to one turn off, in degrees, as -179..180.
+constexpr int turnedRound(int phi) noexcept {
+    return phi <= -180 ? phi + 360 : (phi > 180 ? phi - 360 : phi);
+}
+
 /// One reflection of the room.
 struct ReflectionRecord {
     std::int16_t relativePhi = 0;         ///< degrees from the source's azimuth
