@@ -206,6 +206,32 @@ TEST_F(PluginComparison, AngleAndDistanceFactors) {
     }
 }
 
+TEST_F(PluginComparison, SourcesOverheadBesideAndInsideTheHead) {
+    HostedSource one(48000, 256);
+    one.set(roomSelection, 0.0f);
+    constexpr std::array<Vector3, 13> places = {{
+        {0.0, 0.0, 0.0},
+        {0.0, 2.0, 0.0},
+        {0.0, -2.0, 0.0},
+        {0.0, 0.02, 0.0},
+        {0.001, 0.02, 0.0},
+        {0.0, -0.03, 0.004},
+        {-1.0, 0.0, 0.0005},
+        {1.0, 0.0, -0.0005},
+        {-1.0, 0.0, 0.0},
+        {-1.0, 0.5, 0.002},
+        {0.0, 0.0, -1.0},
+        {-0.00001, 0.0, -1.0},
+        {0.00001, 0.0, -1.0},
+    }};
+    for (const Vector3& place : places) {
+        one.source.position = place;
+        for (int block = 0; block < 3; ++block) {
+            ASSERT_TRUE(one.play(deviation)) << place.x << " " << place.y << " " << place.z;
+        }
+    }
+}
+
 TEST_F(PluginComparison, OcclusionSwingsOverItsTime) {
     for (const int rate : {24000, 48000}) {
         for (const int blockLength : {256, 1024}) {

@@ -80,6 +80,15 @@ TEST_P(EveryQuality, MovingSource) {
     }
 }
 
+/// Single degrees on both axes at once, to and fro over the grid.
+void drift(SourceValues& values, int block) {
+    values.azimuth = wrapToInt16(values.azimuth + (block / 40 % 2 == 0 ? 1 : -1));
+    values.elevation = wrapToInt16(values.elevation + (block / 13 % 3 - 1));
+    if (block % 3 == 2) {
+        values.azimuth = wrapToInt16(values.azimuth + 1);
+    }
+}
+
 class Interpolation : public ComparisonFixture, public ::testing::WithParamInterface<int> {};
 INSTANTIATE_TEST_SUITE_P(Comparison,
                          Interpolation,
@@ -106,6 +115,19 @@ TEST_P(Interpolation, BlendedFiltersFollowTheSource) {
                 ASSERT_TRUE(one->play(deviation));
             }
         }
+    }
+}
+
+TEST_P(Interpolation, OnsetsGlideOnBothAxesAtOnce) {
+    EngineOptions options;
+    options.blockLength = GetParam();
+    options.qvInterpolateFilters = true;
+    SourceValues start;
+    start.azimuth = -80;
+    const auto one = source(options, start);
+    for (int block = 0; block < 240; ++block) {
+        drift(one->values, block);
+        ASSERT_TRUE(one->play(deviation));
     }
 }
 

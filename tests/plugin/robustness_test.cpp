@@ -53,9 +53,10 @@ TEST_F(RobustnessTest, LevelsAnglesAndSwitchesRecover) {
             Source source(library, rate, frames);
             source.effect().setParameter("Input Channel", -1.0f);
             for (const char* name :
-                 {"Gain", "Direct", "Early", "Reverb", "Angle", "Input Channel", "ReflectionLP",
-                  "ReverbLP", "RoomSize", "UnityDistance", "Auralization", "Bass Boost", "Bypass",
-                  "Reverb disable", "Reverb Size", "Reverb ID", "Reverb Send"}) {
+                 {"Gain", "Direct", "Early", "Reverb", "Angle", "Input Channel", "Occlusion",
+                  "Distance", "ReflectionLP", "ReverbLP", "RoomSize", "UnityDistance",
+                  "Auralization", "Bass Boost", "Bypass", "Reverb disable", "Reverb Size",
+                  "Reverb ID", "Reverb Send"}) {
                 SCOPED_TRACE(::testing::Message() << rate << " " << name);
                 const float good =
                     *source.effect().parameter(parameterIndex(source.effect().definition(), name));
@@ -109,6 +110,10 @@ TEST_F(RobustnessTest, DistancesRecover) {
                     EXPECT_EQ(effect.definition().process(&effect.state(), in.data(), out.data(),
                                                           frames, 2, 2),
                               0);
+                    source.blocks(24);
+                    const std::vector<float> heard = source.blocks(2);
+                    ASSERT_TRUE(allFinite(heard)) << value;
+                    ASSERT_GT(energy(heard, 0), 0.0) << value;
                 }
             }
         }

@@ -6,36 +6,10 @@
 #include "data/data_error.h"
 #include "data/import_sofa.h"
 #include "data/import_wav_list.h"
-#include "data/sha256.h"
 #include "data/synthesis.h"
 #include "data/wave_image.h"
 
 namespace tessaly::data {
-
-namespace {
-
-void addRecords(const std::vector<ManifestEntry>& added,
-                const Provenance& provenance,
-                OutputDirectory& output) {
-    std::vector<ManifestEntry> kept = parseManifest(readIfPresent(output.path() / manifestName));
-    std::erase_if(kept, [&output](const ManifestEntry& entry) {
-        std::error_code ignored;
-        return !std::filesystem::exists(output.path() / entry.file, ignored);
-    });
-    const std::vector<ManifestEntry> entries = mergeManifest(std::move(kept), added);
-
-    Attributions attributions = parseAttributions(readIfPresent(output.path() / attributionName));
-    attributions[provenance.sha256] = provenance.attribution;
-    std::erase_if(attributions, [&entries](const auto& item) {
-        return std::none_of(entries.begin(), entries.end(), [&item](const ManifestEntry& entry) {
-            return entry.sourceSha256 == item.first;
-        });
-    });
-    output.add(manifestName, manifestText(entries));
-    output.add(attributionName, attributionText(attributions));
-}
-
-}  // namespace
 
 Measurement importMeasurement(const HrirSource& source) {
     Measurement measurement =
@@ -76,26 +50,24 @@ std::vector<HrirSet> addHrirFiles(const Measurement& measurement,
                                   const HrirOptions& options,
                                   const std::vector<int>& rates,
                                   OutputDirectory& output,
+                                  DirectoryRecords& records,
                                   Progress& progress) {
     const Provenance& provenance = measurement.provenance;
-    std::vector<ManifestEntry> entries;
     std::vector<HrirSet> sets;
     for (const int rate : rates) {
         sets.push_back(synthesise(target.grid.field, rate, tapsFor(options, rate), progress));
         std::string bytes = waveImage(sets.back().pairs, earCount, rate);
-        ManifestEntry& entry = entries.emplace_back();
+        ManifestEntry entry;
         entry.file = rateEntry(rate).fileName;
-        entry.size = bytes.size();
-        entry.sha256 = sha256(bytes);
         entry.content = fmt::format("HRIR set, {} Hz, {} taps, {} directions", rate,
                                     sets.back().taps, packedOrder().size());
         entry.source = provenance.path.string();
         entry.sourceSha256 = provenance.sha256;
         entry.licence = provenance.licence;
         entry.options = toText(options);
-        output.add(entry.file, std::move(bytes));
+        records.add(output, std::move(entry), std::move(bytes));
     }
-    addRecords(entries, provenance, output);
+    records.addTerms(provenance.sha256, provenance.attribution);
     return sets;
 }
 

@@ -5,9 +5,8 @@
 #include <string>
 #include <vector>
 
+#include "data/directory_records.h"
 #include "data/hrir_set.h"
-#include "data/manifest.h"
-#include "data/output_directory.h"
 #include "data/target_field.h"
 
 namespace tessaly::data {
@@ -31,14 +30,15 @@ std::vector<int> ratesToBuild(const std::vector<int>& wanted);
 /// @throws DataError if the option is out of range
 std::size_t tapsFor(const HrirOptions& options, int sampleRate);
 
-/// Synthesises the sets and adds them, with manifest and attribution, to the directory. Does not
-/// commit. Equal input gives equal bytes.
+/// Synthesises the sets and adds them, with their records, to the directory. Does not commit.
+/// Equal input gives equal bytes.
 /// @return the sets, in the order of `rates`
 std::vector<HrirSet> addHrirFiles(const Measurement& measurement,
                                   const TargetField& target,
                                   const HrirOptions& options,
                                   const std::vector<int>& rates,
                                   OutputDirectory& output,
+                                  DirectoryRecords& records,
                                   Progress& progress);
 
 }  // namespace tessaly::data

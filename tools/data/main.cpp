@@ -3,8 +3,8 @@
 #include <cstdio>
 #include <exception>
 
+#include "data/build_command.h"
 #include "data/data_error.h"
-#include "data/hrir_command.h"
 #include "data/import_sofa.h"
 #include "data/verify_command.h"
 
@@ -12,39 +12,79 @@ namespace {
 
 using namespace tessaly::data;
 
-/// What the command line gives as words.
-struct HrirWords {
+/// What the command line gives as words, shared by the building commands.
+struct Words {
     std::vector<std::string> rates = {"44100", "48000", "24000"};
     std::string symmetry = "auto";
+    std::string level = "rule";
+    std::string headphoneRate = "48000";
 };
 
-void addHrirCommand(CLI::App& application, HrirCommand& command, HrirWords& words) {
-    CLI::App* hrir = application.add_subcommand(
-        "hrir", "Build the packed HRIR files TSLdata120.dat (44100 Hz), 121 (48000), 122 (24000)");
-    command.source.sofa = defaultSofaPath;
+void addSourceOptions(CLI::App& application, BuildCommand& command, Words& words) {
     CLI::Option* sofa =
-        hrir->add_option("--sofa", command.source.sofa, "measured set, SOFA SimpleFreeFieldHRIR")
+        application
+            .add_option("--sofa", command.source.sofa, "measured set, SOFA SimpleFreeFieldHRIR")
             ->capture_default_str();
-    hrir->add_option("--wav-list", command.source.wavList,
-                     "measured set as a text list of two-channel WAV files, left ear first; "
-                     "lines: file azimuth_ccw elevation")
+    application
+        .add_option("--wav-list", command.source.wavList,
+                    "measured set as a text list of two-channel WAV files, left ear first; "
+                    "lines: file azimuth_ccw elevation")
         ->excludes(sofa);
-    hrir->add_option("--out", command.directory, "directory to write into")->required();
-    hrir->add_option("--rates", words.rates, "sample rates; 44100 is always built")
-        ->delimiter(',')
+    application.add_option("--out", command.directory, "directory to write into")->required();
+    application.add_flag("!--no-dfeq", command.hrirOptions.diffuseFieldEqualisation,
+                         "leave loudspeaker and ear canal in: no diffuse-field equalisation");
+    application
+        .add_option("--symmetry", words.symmetry,
+                    "average left and right: auto (if they differ by less than 1 dB), on, off")
         ->capture_default_str();
-    hrir->add_flag("!--no-dfeq", command.options.diffuseFieldEqualisation,
-                   "leave loudspeaker and ear canal in: no diffuse-field equalisation");
-    hrir->add_option("--symmetry", words.symmetry,
-                     "average left and right: auto (if they differ by less than 1 dB), on, off")
+    application.add_option("--taps", command.hrirOptions.taps,
+                           "length of each response instead of the engine's for the rate; 256 for "
+                           "its long form, in a directory of its own");
+    application
+        .add_option("--gain", command.hrirOptions.gainDb, "dB on top of the reference level")
         ->capture_default_str();
-    hrir->add_option("--taps", command.options.taps,
-                     "length of each response instead of the engine's for the rate; 256 for its "
-                     "long form, in a directory of its own");
-    hrir->add_option("--gain", command.options.gainDb, "dB on top of the reference level")
+    application.add_option("--lowest", command.hrirOptions.lowestElevation,
+                           "elevation in degrees below which the measurement is not used");
+}
+
+void addRates(CLI::App& application, Words& words, const char* help) {
+    application.add_option("--rates", words.rates, help)->delimiter(',')->capture_default_str();
+}
+
+void addTailOptions(CLI::App& application, BuildCommand& command, Words& words) {
+    application.add_option("--tails", command.measuredTails,
+                           "directory of measured tails, preset_15.wav to preset_60.wav and, for "
+                           "details, tails.ini; other presets get a synthetic one");
+    application.add_option("--wet", command.tailOptions.wetDb, "dB on top, of all tails")
         ->capture_default_str();
-    hrir->add_option("--lowest", command.options.lowestElevation,
-                     "elevation in degrees below which the measurement is not used");
+    application
+        .add_option("--level", words.level,
+                    "level of each tail: rule (by volume and decay), peak (0.9 each)")
+        ->capture_default_str();
+}
+
+void addHeadphoneOptions(CLI::App& application, BuildCommand& command, Words& words) {
+    application
+        .add_option("--hp-rate", words.headphoneRate,
+                    "rate that the headphone filters are made for; the engine uses them at all")
+        ->capture_default_str();
+    application.add_flag("--hp-flat-bass", command.headphoneOptions.flatBass,
+                         "without the bass shelf of the settings");
+    application.add_option("--hp-filter", command.filters,
+                           "ROW=FILE: another filter for a row 1 to 10, a mono WAV file or a text "
+                           "of lines \"Filter 1: ON PK Fc 105 Hz Gain 1.0 dB Q 0.70\"");
+    application.add_flag("--hp-minimum-phase", command.minimumPhaseFilters,
+                         "keep the level of such WAV files and drop their phase");
+}
+
+/// Sets what the words say.
+void readWords(const Words& words, BuildCommand& command) {
+    command.hrirOptions.symmetry = symmetryFromText(words.symmetry);
+    command.tailOptions.level = tailLevelFromText(words.level);
+    command.headphoneOptions.sampleRate = rateFromText(words.headphoneRate);
+    for (const std::string& rate : words.rates) {
+        command.rates.push_back(rateFromText(rate));
+    }
 }
 
 int run(int argumentCount, char** arguments) {
@@ -52,9 +92,34 @@ int run(int argumentCount, char** arguments) {
     application.require_subcommand(1);
     application.set_version_flag("--version", TESSALY_VERSION_TEXT);
 
-    HrirCommand hrir;
-    HrirWords words;
-    addHrirCommand(application, hrir, words);
+    BuildCommand command;
+    command.source.sofa = defaultSofaPath;
+    Words words;
+    constexpr const char* hrirRates = "sample rates; of the HRIR files 44100 is always built";
+
+    CLI::App* all = application.add_subcommand(
+        "all", "Build everything: HRIR set, reverb tails, headphone filters");
+    addSourceOptions(*all, command, words);
+    addRates(*all, words, hrirRates);
+    addTailOptions(*all, command, words);
+    addHeadphoneOptions(*all, command, words);
+
+    CLI::App* hrir = application.add_subcommand(
+        "hrir", "Build the packed HRIR files TSLdata120.dat (44100 Hz), 121 (48000), 122 (24000)");
+    addSourceOptions(*hrir, command, words);
+    addRates(*hrir, words, hrirRates);
+
+    CLI::App* tails = application.add_subcommand(
+        "tails",
+        "Build the packed reverb tails TSLdata510.dat (44100 Hz), 511 (48000), 512 (24000)");
+    addSourceOptions(*tails, command, words);
+    addRates(*tails, words, "sample rates");
+    addTailOptions(*tails, command, words);
+
+    CLI::App* headphones =
+        application.add_subcommand("headphones", "Build the headphone filters and the small one");
+    addSourceOptions(*headphones, command, words);
+    addHeadphoneOptions(*headphones, command, words);
 
     std::filesystem::path directory;
     std::filesystem::path sofa;
@@ -67,11 +132,11 @@ int run(int argumentCount, char** arguments) {
     if (verify->parsed()) {
         return runVerify(directory, sofa) ? 0 : 1;
     }
-    hrir.options.symmetry = symmetryFromText(words.symmetry);
-    for (const std::string& rate : words.rates) {
-        hrir.rates.push_back(rateFromText(rate));
-    }
-    runHrir(hrir);
+    command.hrir = all->parsed() || hrir->parsed();
+    command.tails = all->parsed() || tails->parsed();
+    command.headphones = all->parsed() || headphones->parsed();
+    readWords(words, command);
+    runBuild(command);
     return 0;
 }
 

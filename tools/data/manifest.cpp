@@ -32,6 +32,9 @@ std::string manifestText(const std::vector<ManifestEntry>& entries) {
             "source sha256: {}\nlicence: {}\noptions: {}\n",
             entry.file, entry.size, entry.sha256, oneLine(entry.content), oneLine(entry.source),
             entry.sourceSha256, oneLine(entry.licence), oneLine(entry.options));
+        for (const std::string& part : entry.parts) {
+            text += fmt::format("part: {}\n", oneLine(part));
+        }
     }
     return text;
 }
@@ -71,6 +74,8 @@ std::vector<ManifestEntry> parseManifest(const std::string& text) {
             entry.licence = value;
         } else if (name == "options") {
             entry.options = value;
+        } else if (name == "part") {
+            entry.parts.push_back(value);
         }
     }
     return entries;

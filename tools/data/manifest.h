@@ -21,6 +21,7 @@ struct ManifestEntry {
     std::string sourceSha256;
     std::string licence;
     std::string options;
+    std::vector<std::string> parts = {};  ///< what a file is put together from, if several
 
     bool operator==(const ManifestEntry&) const = default;
 };

@@ -21,7 +21,8 @@ constexpr double fadeOutSeconds = 0.36e-3;
 class Synthesiser {
 public:
     explicit Synthesiser(int sampleRate)
-        : sampleRate_(sampleRate),
+        : rate_(sampleRate),
+          sampleRate_(sampleRate),
           transform_(transformLength),
           minimumPhase_(transform_),
           logMagnitude_(transform_.bins()),
@@ -37,6 +38,18 @@ public:
         }
     }
 
+    /// @return the response, `taps` of transformLength samples are windowed; valid until the next
+    /// call
+    double* response(const ResponseField& field, std::size_t taps, std::size_t entry, int ear) {
+        const EarDelays delays = earDelays(field.itdSeconds[entry]);
+        const double own = ear == leftEar ? delays.left : delays.right;
+        double* samples = make(field.levels.curve(entry, ear), field.levels.bins,
+                               field.levels.binHertz, own + headSeconds + preDelaySeconds);
+        applyWindow(samples, taps, rate_);
+        return samples;
+    }
+
+private:
     /// @return transformLength samples, not windowed yet; valid until the next call
     double* make(const double* curve, std::size_t bins, double binHertz, double delay) {
         const double stepHertz = sampleRate_ / static_cast<double>(transformLength);
@@ -56,7 +69,7 @@ public:
         return time_.data();
     }
 
-private:
+    int rate_;
     double sampleRate_;
     RealTransform transform_;
     MinimumPhase minimumPhase_;
@@ -80,6 +93,13 @@ void applyWindow(double* response, std::size_t taps, int sampleRate) noexcept {
     }
 }
 
+std::vector<double> synthesiseResponse(
+    const ResponseField& field, int sampleRate, std::size_t taps, std::size_t entry, int ear) {
+    Synthesiser synthesiser(sampleRate);
+    const double* response = synthesiser.response(field, taps, entry, ear);
+    return {response, response + taps};
+}
+
 HrirSet synthesise(const ResponseField& field,
                    int sampleRate,
                    std::size_t taps,
@@ -91,13 +111,8 @@ HrirSet synthesise(const ResponseField& field,
     Synthesiser synthesiser(sampleRate);
     progress.stage(fmt::format("synthesising {} Hz", sampleRate), packedOrder().size());
     for (std::size_t entry = 0; entry < packedOrder().size(); ++entry) {
-        const EarDelays delays = earDelays(field.itdSeconds[entry]);
         for (int ear = 0; ear < earCount; ++ear) {
-            const double own = ear == leftEar ? delays.left : delays.right;
-            double* response =
-                synthesiser.make(field.levels.curve(entry, ear), field.levels.bins,
-                                 field.levels.binHertz, own + headSeconds + preDelaySeconds);
-            applyWindow(response, taps, sampleRate);
+            const double* response = synthesiser.response(field, taps, entry, ear);
             float* frame = set.pairs.data() + entry * taps * earCount + (ear == rightEar ? 0 : 1);
             for (std::size_t i = 0; i < taps; ++i) {
                 frame[i * earCount] = single(response[i]);

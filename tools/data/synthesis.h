@@ -17,6 +17,10 @@ HrirSet synthesise(const ResponseField& field,
                    std::size_t taps,
                    Progress& progress);
 
+/// One response of one direction, as `synthesise` makes it.
+std::vector<double> synthesiseResponse(
+    const ResponseField& field, int sampleRate, std::size_t taps, std::size_t entry, int ear);
+
 /// Fades the first 3 samples in and the last 0.36 ms out.
 /// @param response  `taps` samples, changed in place
 void applyWindow(double* response, std::size_t taps, int sampleRate) noexcept;

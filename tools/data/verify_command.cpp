@@ -113,34 +113,39 @@ bool isReference(const ManifestEntry& entry, HrirOptions options) {
 
 }  // namespace
 
-Verification verifyDirectory(const fs::path& directory, const fs::path& sofa) {
+ManifestEntry VerifiedDirectory::entryOf(const std::string& file, Verification& result) const {
+    const auto recorded =
+        std::find_if(manifest.begin(), manifest.end(),
+                     [&file](const ManifestEntry& other) { return other.file == file; });
+    if (recorded != manifest.end()) {
+        checkRecord(*recorded, path / file, result);
+        return *recorded;
+    }
+    if (!manifest.empty()) {
+        result.failures.push_back(fmt::format("{} is not in {}", file, manifestName));
+    }
+    return {};
+}
+
+Verification verifyDirectory(const fs::path& path, const fs::path& sofa) {
     Verification result;
     Progress progress(stderr);
-    if (!fs::is_directory(directory)) {
-        throw DataError("{} is no directory", directory.string());
+    if (!fs::is_directory(path)) {
+        throw DataError("{} is no directory", path.string());
     }
-    const std::vector<ManifestEntry> manifest =
-        parseManifest(readIfPresent(directory / manifestName));
-    if (manifest.empty()) {
+    VerifiedDirectory directory{path, parseManifest(readIfPresent(path / manifestName)), {}};
+    if (directory.manifest.empty()) {
         result.notes.push_back(fmt::format("no {}: taken for the default set", manifestName));
     }
     Targets targets(sofa, result.notes, progress);
+    const TargetField* headphoneTarget = nullptr;
     for (const RateEntry& rate : rateTable()) {
-        if (!fs::exists(directory / rate.fileName)) {
+        if (!fs::exists(path / rate.fileName)) {
             continue;
         }
-        ManifestEntry entry;
-        const auto recorded = std::find_if(
-            manifest.begin(), manifest.end(),
-            [&rate](const ManifestEntry& other) { return other.file == rate.fileName; });
-        if (recorded != manifest.end()) {
-            entry = *recorded;
-            checkRecord(entry, directory / rate.fileName, result);
-        } else if (!manifest.empty()) {
-            result.failures.push_back(fmt::format("{} is not in {}", rate.fileName, manifestName));
-        }
+        const ManifestEntry entry = directory.entryOf(rate.fileName, result);
         const HrirOptions options = hrirOptionsFromText(entry.options);
-        const HrirSet set = readPackedSet(directory, rate);
+        const HrirSet& set = directory.sets[rate.sampleRate] = readPackedSet(path, rate);
         checkLength(set, options, result);
         SetExpectations expectations;
         expectations.target = targets.find(entry, options);
@@ -149,20 +154,21 @@ Verification verifyDirectory(const fs::path& directory, const fs::path& sofa) {
         expectations.symmetric = expectations.target != nullptr
                                      ? expectations.target->grid.symmetric
                                      : expectations.reference || options.symmetry == Symmetry::on;
+        headphoneTarget = headphoneTarget != nullptr ? headphoneTarget : expectations.target;
         result.columns.push_back({fmt::format("{}/{}", rate.sampleRate, set.taps),
                                   hrirFigures(set, expectations, progress)});
     }
-    for (const ManifestEntry& entry : manifest) {
-        if (!fs::exists(directory / entry.file)) {
+    for (const ManifestEntry& entry : directory.manifest) {
+        if (!fs::exists(path / entry.file)) {
             result.failures.push_back(
                 fmt::format("{} is missing, {} lists it", entry.file, manifestName));
         }
     }
-    if (result.columns.empty()) {
-        throw DataError("no HRIR file in {}; expected {}", directory.string(),
+    if (result.columns.empty() && !hasTails(path) && !hasHeadphones(path)) {
+        throw DataError("no HRIR file in {}; expected {}", path.string(),
                         rateTable().front().fileName);
     }
-    if (!fs::exists(directory / rateTable().front().fileName)) {
+    if (!fs::exists(path / rateTable().front().fileName)) {
         result.failures.push_back(
             fmt::format("{} is missing: the plug-in knows a data directory by it",
                         rateTable().front().fileName));
@@ -170,12 +176,25 @@ Verification verifyDirectory(const fs::path& directory, const fs::path& sofa) {
     for (std::string& line : failedFigures(result.columns)) {
         result.failures.push_back(std::move(line));
     }
+    verifyTails(directory, result, progress);
+    if (hasHeadphones(path)) {
+        verifyHeadphones(directory, headphoneTarget, result);
+    }
     return result;
 }
 
 bool runVerify(const fs::path& directory, const fs::path& sofa) {
     const Verification result = verifyDirectory(directory, sofa);
-    fmt::print("{}", figureTable(result.columns));
+    if (!result.columns.empty()) {
+        fmt::print("{}\n", figureTable(result.columns));
+    }
+    if (!result.tailColumns.empty()) {
+        fmt::print("{}\nleast / greatest over all tails\n{}\n", result.tailTable,
+                   figureTable(result.tailColumns));
+    }
+    if (!result.headphoneColumns.empty()) {
+        fmt::print("{}\n", figureTable(result.headphoneColumns));
+    }
     for (const std::string& note : result.notes) {
         fmt::print("{}\n", note);
     }

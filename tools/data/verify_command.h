@@ -2,21 +2,12 @@
 #pragma once
 
 #include <filesystem>
-#include <string>
-#include <vector>
 
-#include "data/figure_table.h"
+#include "data/verification.h"
 
 namespace tessaly::data {
 
-/// Result of a check of a directory.
-struct Verification {
-    std::vector<FigureColumn> columns;  ///< a rate each
-    std::vector<std::string> notes;     ///< what could not be compared, and why
-    std::vector<std::string> failures;  ///< empty: all is well
-};
-
-/// Reads the sets of a directory through the library's reader and measures them.
+/// Reads all files of a directory through the library's reader and measures them.
 /// @param sofa  measured set to compare with; empty: the one that the manifest names
 /// @throws DataError if there is nothing to check or a file cannot be read at all
 Verification verifyDirectory(const std::filesystem::path& directory,

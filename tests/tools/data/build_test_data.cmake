@@ -6,7 +6,8 @@ if(NOT EXISTS "${SOURCE}")
 endif()
 if(EXISTS "${OUT}/MANIFEST.txt" AND "${OUT}/MANIFEST.txt" IS_NEWER_THAN "${PROGRAM}"
    AND EXISTS "${OUT}/TSLdata120.dat" AND EXISTS "${OUT}/TSLdata121.dat"
-   AND EXISTS "${OUT}/TSLdata122.dat")
+   AND EXISTS "${OUT}/TSLdata122.dat" AND EXISTS "${OUT}/TSLdata512.dat"
+   AND EXISTS "${OUT}/IP23M3_512_FadeOut")
     return()
 endif()
-execute_process(COMMAND "${PROGRAM}" hrir --out "${OUT}" COMMAND_ERROR_IS_FATAL ANY)
+execute_process(COMMAND "${PROGRAM}" all --out "${OUT}" COMMAND_ERROR_IS_FATAL ANY)

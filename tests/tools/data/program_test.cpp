@@ -1,62 +1,26 @@
 // The program as a user runs it: exit codes, messages, what it leaves behind.
-#include <fmt/format.h>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-#include <sys/wait.h>
 
-#include <algorithm>
-#include <cstdlib>
 #include <cstring>
 #include <fstream>
 #include <sndfile.hh>
 
 #include "data/import_sofa.h"
-#include "data/manifest.h"
-#include "data/output_directory.h"
 #include "data/sha256.h"
 #include "data/wave_image.h"
-#include "tools/data/scratch_directory.h"
+#include "tools/data/program_fixture.h"
 #include "tools/data/synthetic_head.h"
 
 namespace tessaly::data {
 namespace {
 
-namespace fs = std::filesystem;
 using testing::AllOf;
 using testing::HasSubstr;
 using testing::Not;
 
-struct Outcome {
-    int code = -1;
-    std::string output;
-    std::string errors;
-};
-
-class Program : public testing::Test {
+class HrirProgram : public Program {
 protected:
-    Outcome run(const std::string& arguments) {
-        const fs::path output = scratch.path() / ".stdout";
-        const fs::path errors = scratch.path() / ".stderr";
-        const std::string command =
-            fmt::format("cd '{}' && '{}' {} > .stdout 2> .stderr", scratch.path().string(),
-                        TESSALY_DATA_PROGRAM, arguments);
-        const int status = std::system(command.c_str());
-        Outcome outcome{WIFEXITED(status) ? WEXITSTATUS(status) : -1, readIfPresent(output),
-                        readIfPresent(errors)};
-        fs::remove(output);
-        fs::remove(errors);
-        return outcome;
-    }
-    /// One line on the error stream, a non-zero code, and no output directory.
-    void expectRefusal(const std::string& arguments, const std::string& message) {
-        const Outcome outcome = run(arguments);
-        EXPECT_EQ(outcome.code, 1) << arguments;
-        EXPECT_THAT(outcome.errors, AllOf(HasSubstr("tessaly-data: "), HasSubstr(message)));
-        EXPECT_EQ(std::count(outcome.errors.begin(), outcome.errors.end(), '\n'), 1)
-            << outcome.errors;
-        EXPECT_EQ(outcome.output, "");
-        EXPECT_FALSE(fs::exists(scratch.path() / "out")) << arguments;
-    }
     void writeHead(const Measurement& head) {
         std::ofstream list(scratch.path() / "list.txt");
         for (std::size_t i = 0; i < head.count(); ++i) {
@@ -73,9 +37,6 @@ protected:
                  << '\n';
         }
     }
-    static bool dataSetPresent() { return fs::exists(fs::path(TESSALY_TEST_DATA) / manifestName); }
-
-    ScratchDirectory scratch;
 };
 
 TEST_F(Program, FilesThatAreNoSofaSetLeaveNothing) {
@@ -108,7 +69,7 @@ TEST_F(Program, PlacesThatCannotBeWrittenToAreNamed) {
     EXPECT_EQ(readIfPresent(scratch.path() / "file"), "x");
 }
 
-TEST_F(Program, SwappedEarsAndMirroredAzimuthLeaveNothing) {
+TEST_F(HrirProgram, SwappedEarsAndMirroredAzimuthLeaveNothing) {
     Measurement head = syntheticHead(30, -60);
     for (int step = 1; head.count() < 100 && step < 4; ++step) {
         head = syntheticHead(30 - 5 * step, -60);
@@ -124,12 +85,12 @@ TEST_F(Program, SwappedEarsAndMirroredAzimuthLeaveNothing) {
     expectRefusal("hrir --wav-list list.txt --out out", "expected the left ear first and louder");
 }
 
-TEST_F(Program, TooFewDirectionsLeaveNothing) {
+TEST_F(HrirProgram, TooFewDirectionsLeaveNothing) {
     writeHead(syntheticHead(45, -45));
     expectRefusal("hrir --wav-list list.txt --out out", "found 25, expected 100");
 }
 
-TEST_F(Program, WavListsBecomeASetThatVerifies) {
+TEST_F(HrirProgram, WavListsBecomeASetThatVerifies) {
     writeHead(syntheticHead());
     const Outcome built = run("hrir --wav-list list.txt --out out --rates 24000 --taps 64");
     EXPECT_EQ(built.code, 0) << built.errors;
@@ -153,22 +114,6 @@ TEST_F(Program, VerifyNeedsASet) {
     EXPECT_THAT(outcome.errors, HasSubstr("none is no directory"));
 }
 
-class BuiltData : public Program {
-protected:
-    void SetUp() override {
-        if (!dataSetPresent()) {
-            GTEST_SKIP() << "no data set in " << TESSALY_TEST_DATA;
-        }
-    }
-    /// A directory with the smallest files of the set.
-    void copySet(const std::vector<const char*>& names) {
-        fs::create_directory(scratch.path() / "set");
-        for (const char* name : names) {
-            fs::copy_file(fs::path(TESSALY_TEST_DATA) / name, scratch.path() / "set" / name);
-        }
-    }
-};
-
 TEST_F(BuiltData, HasTheSizesOfTheEnginesFiles) {
     const fs::path data = TESSALY_TEST_DATA;
     EXPECT_EQ(fs::file_size(data / "TSLdata120.dat"), 2582572u);
@@ -178,6 +123,9 @@ TEST_F(BuiltData, HasTheSizesOfTheEnginesFiles) {
     for (const ManifestEntry& entry : parseManifest(readIfPresent(data / manifestName))) {
         EXPECT_EQ(entry.sha256, sha256OfFile(data / entry.file));
         EXPECT_EQ(entry.size, fs::file_size(data / entry.file));
+        if (entry.file.rfind("TSLdata12", 0) != 0) {
+            continue;
+        }
         EXPECT_EQ(entry.sourceSha256, kemarSha256);
         EXPECT_EQ(entry.options, "dfeq=on symmetry=auto taps=default gain=0 lowest=auto");
     }
