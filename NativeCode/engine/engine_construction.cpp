@@ -114,10 +114,17 @@ void setGridSteps(EngineState& state) {
 }
 
 Reflections::LoadContext reflectionContext(EngineState& state) {
-    return Reflections::LoadContext{
-        state.switches, state.sampleRate,         state.sampleRateRatio, state.samplesPerMetre,
-        hpTFactive,     state.earlyFlexRefPreset, *state.database,       state.hrirRequest(),
-        state.controls, state.sizes.FIR_size};
+    return Reflections::LoadContext{state.switches,
+                                    state.sampleRate,
+                                    state.sampleRateRatio,
+                                    state.samplesPerMetre,
+                                    hpTFactive,
+                                    state.earlyFlexRefPreset,
+                                    *state.database,
+                                    state.hrirRequest(),
+                                    state.controls,
+                                    state.tail,
+                                    state.sizes.FIR_size};
 }
 
 void takeStartDirection(EngineState& state) {

@@ -1,34 +1,26 @@
 // The length of the composed response and everything that follows from it.
 #include "engine/fir_size.h"
 
-#include <array>
 #include <cmath>
 #include <limits>
 
 #include "base/log.h"
+#include "engine/room_presets.h"
 
 namespace tessaly {
 
 namespace {
 
-constexpr int presetCount = 60;
-
-// clang-format off
-constexpr std::array<int, presetCount + 1> firSizes = {
-    /*  0 */     0,  1024,  1024,  1024,  2048,  4096,  4096,  8192,  4096,  1024,
-    /* 10 */  4096,  2048,  4096,  8192,  4096,  2048,  8192,  2048,  2048,  8192,
-    /* 20 */  1024,  4096,  8192,  2048,  8192, 16384,  8192,  4096,  2048,  8192,
-    /* 30 */  8192,  8192,  4096,  8192,  8192,  8192,  4096,  8192,  8192,  4096,
-    /* 40 */  4096,  2048,  4096,  4096,  8192,  4096,  4096,  8192,  4096,  8192,
-    /* 50 */  8192,  2048,  1024,  2048,  8192,  2048,  2048,  4096,  4096,  8192,
-    /* 60 */  8192,
-};
-// clang-format on
+/// The one room whose row asks for no power of two: its response takes the next one.
+constexpr int oddRoom = 7;
+constexpr int oddRoomFirSize = 8192;
 
 }  // namespace
 
 int earlyFlexFirSizeOf(int preset) noexcept {
-    return preset >= 1 && preset <= presetCount ? firSizes[static_cast<std::size_t>(preset)] : 0;
+    RoomPreset room;
+    lookUpRoomPreset(preset, room);
+    return preset == oddRoom ? oddRoomFirSize : room.earlyFlexFirSize;
 }
 
 void deriveFirSizes(FirSizes& sizes,

@@ -1,10 +1,13 @@
 // Loading of the room preset's records and of the fixed pair.
 #include "engine/reflections.h"
 
+#include <algorithm>
 #include <cstdlib>
 
 #include "base/log.h"
 #include "base/numeric_conversion.h"
+#include "base/precision.h"
+#include "engine/room_presets.h"
 #include "resources/hrir_tables.h"
 
 namespace tessaly {
@@ -15,7 +18,7 @@ constexpr std::int16_t fixedPhi1st = -90;   // degrees
 constexpr std::int16_t fixedPhi2nd = 85;    // degrees
 constexpr std::int16_t fixedTheta = 0;      // degrees
 constexpr int headphoneFilterFrames = 256;  // the headphone filter lengthens a response by these
-constexpr int highestPreset = 60;
+constexpr double recordGain = 0.55;         // on every preset gain
 
 /// Samples by which a delay must shrink so that a whole HRIR ends with the response.
 std::int32_t offsetOf(const Reflections::LoadContext& context, int delay) noexcept {
@@ -72,20 +75,85 @@ void loadFixed(const Reflections::LoadContext& context,
 }  // namespace
 
 void Reflections::loadFlexReflections(LoadContext context) {
-    context.request.phi = context.request.phiNew;
-    context.request.theta = context.request.thetaIn;
-    if (context.earlyFlexRefPreset < 0 || context.earlyFlexRefPreset > highestPreset) {
+    const HrirRequest& request = context.request;
+    request.phi = request.phiNew;
+    request.theta = request.thetaIn;
+
+    RoomPreset preset;
+    if (!lookUpRoomPreset(context.earlyFlexRefPreset, preset)) {
         logError("ERROR: ER-Preset doesn't exist!");
     }
+    takePreset(context, preset);
+    context.FIR_size = std::max(context.FIR_size, preset.earlyFlexFirSize);
+    makeRecords(context, preset);
+    if (context.switches.qvTrackDirection) {
+        return;  // the first direction update finds the directions in the full table
+    }
+    for (std::size_t k = 0; k < static_cast<std::size_t>(flexReflectionCount); ++k) {
+        loadRecordHrir(context, records[k]);
+    }
+    request.phi = request.phiNew;
+    request.theta = request.thetaIn;
+}
 
-    // Rooms are dry: no preset has rows yet, so every room is one without reflections.
-    flexReflectionCount = 0;
+void Reflections::takePreset(const LoadContext& context, const RoomPreset& preset) {
+    flexReflectionCount = preset.flexReflectionCount;
+    earlyFlexFirSize = preset.earlyFlexFirSize;
+    earlyPresetGain = preset.earlyPresetGain;
+    presetUsesFilters = preset.presetUsesFilters;
+    LiveControls& controls = context.controls;
+    controls.roomDistances = preset.roomDistances;
+    controls.reflectionLP_Fc = preset.reflectionLP_Fc;
+    controls.reflectionLP2_Fc = preset.reflectionLP2_Fc;
+    controls.reverbLP_Fc = preset.reverbLP_Fc;
+    const auto lowPassAt = [&](float cutOff) {
+        return Biquad(Biquad::lowPass, 0.0, Biquad::normalise(cutOff, context.sampleRate));
+    };
+    reflectionFilter = {lowPassAt(controls.reflectionLP_Fc), lowPassAt(controls.reflectionLP2_Fc)};
+    context.tail.hasReverbLowPass = preset.hasReverbLowPass;
+    if (preset.hasReverbLowPass) {
+        context.tail.reverbLowPass = lowPassAt(controls.reverbLP_Fc);
+    }
+}
 
-    const LiveControls& controls = context.controls;
-    const std::array<float, 2> cutOffs = {controls.reflectionLP_Fc, controls.reflectionLP2_Fc};
-    for (std::size_t k = 0; k < cutOffs.size(); ++k) {
-        reflectionFilter[k] =
-            Biquad(Biquad::lowPass, 0.0, Biquad::normalise(cutOffs[k], context.sampleRate));
+void Reflections::makeRecords(const LoadContext& context, const RoomPreset& preset) {
+    for (std::size_t k = 0; k < static_cast<std::size_t>(flexReflectionCount); ++k) {
+        ReflectionRecord& record = records[k];
+        record = ReflectionRecord{};
+        record.relativePhi = wrapToInt16(preset.presetPhi[k]);
+        record.relativeTheta = wrapToInt16(preset.presetTheta[k]);
+        record.phi = wrapToInt16(record.relativePhi + context.request.phi);
+        record.theta = wrapToInt16(record.relativeTheta + context.request.theta);
+        record.presetDelaySamples =
+            truncateToInt16(static_cast<float>(preset.presetDelay[k]) * context.sampleRateRatio);
+        record.delaySamples = record.presetDelaySamples;
+        record.distanceGain = 1.0f;
+        record.reflectionDistance = 1.0f;
+        record.gain = single(wide(preset.presetGain[k]) * recordGain);
+        record.filterClass =
+            presetUsesFilters ? wrapToInt16(preset.presetFilterClass[k]) : std::int16_t{-1};
+        if (context.earlyFlexRefPreset >= firstMetricPreset) {
+            // One over the path length in metres.
+            record.distanceGain =
+                std::min(context.samplesPerMetre / static_cast<float>(record.delaySamples), 1.0f);
+        }
+    }
+}
+
+void Reflections::loadRecordHrir(const LoadContext& context, ReflectionRecord& record) {
+    const HrirRequest& request = context.request;
+    record.phi = wrapToInt16(turnedRound(record.phi));
+    record.indexPhi = phiToIndex(record.phi);
+    record.theta = std::clamp<std::int16_t>(record.theta, -steepestTheta, steepestTheta);
+    record.indexTheta = thetaToIndex(record.theta);
+    request.phi = record.phi;
+    request.theta = record.theta;
+    logTrace("EarlyFlexReflection-HRIR-Degree phi ", record.phi, " and theta ", record.theta,
+             " loading separately with indexPhi = ", record.indexPhi,
+             " and indexTheta = ", record.indexTheta);
+    HrirSlot* const cell = filterTableCell(record.indexPhi, record.indexTheta);
+    if (cell != nullptr && context.database.loadFilterFile(*cell, request)) {
+        logTrace("loadet FilterFile succesfully!");
     }
 }
 

@@ -7,9 +7,22 @@
 #include "engine/biquad.h"
 #include "engine/engine_settings.h"
 #include "engine/live_controls.h"
+#include "engine/reverb_tail.h"
 #include "resources/hrir_database.h"
 
 namespace tessaly {
+
+struct RoomPreset;
+
+/// From this preset on gains follow the path length.
+inline constexpr int firstMetricPreset = 13;
+/// Steepest elevation of a reflection, degrees.
+inline constexpr std::int16_t steepestTheta = 75;
+
+/// An azimuth of up to one turn off, in degrees, as -179..180.
+constexpr int turnedRound(int phi) noexcept {
+    return phi <= -180 ? phi + 360 : (phi > 180 ? phi - 360 : phi);
+}
 
 /// One reflection of the room.
 struct ReflectionRecord {
@@ -45,6 +58,7 @@ public:
         HrirDatabase& database;
         HrirRequest request;     ///< the engine's direction fields
         LiveControls& controls;  ///< takes the preset's cut-offs and walls
+        ReverbTail& tail;        ///< takes the preset's low-pass
         int& FIR_size;           ///< raised to what the room needs
     };
 
@@ -70,6 +84,12 @@ public:
     std::int16_t earlyRefLength_2nd = 0;
     HrirSlot earlyRefFilter_1st = nullptr;  ///< null: silent
     HrirSlot earlyRefFilter_2nd = nullptr;
+
+private:
+    void takePreset(const LoadContext& context, const RoomPreset& preset);
+    void makeRecords(const LoadContext& context, const RoomPreset& preset);
+    /// Fetches the direction of a record into its cell, for engines without the full table.
+    static void loadRecordHrir(const LoadContext& context, ReflectionRecord& record);
 };
 
 }  // namespace tessaly

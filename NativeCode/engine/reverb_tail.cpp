@@ -8,6 +8,7 @@
 #include "base/numeric_conversion.h"
 #include "base/precision.h"
 #include "engine/ear_mix.h"
+#include "engine/reverb_presets.h"
 #include "resources/hrir_tables.h"
 
 namespace tessaly {
@@ -29,18 +30,29 @@ constexpr int levelAngle = 90;          // degrees from the south pole
 
 }  // namespace
 
-void ReverbTail::loadIReverb(std::int16_t preset,
-                             std::int16_t& qvReverb,
-                             const WavSource& /*source*/) {
+void ReverbTail::loadIReverb(std::int16_t preset, std::int16_t& qvReverb, WavSource source) {
     logOutput("\n___loadIReverb ", preset, " now...");
     loadingReverb = true;
-    if (preset > reverbTableEntries || preset < 0) {
+    const ReverbPreset* const row = findReverbPreset(preset);
+    if (preset == 0) {
+        logOutput("reverb activ, but no Filter selected!!!");
+        reverbLength = 0;
+    } else if (row == nullptr) {
         logOutput("reverb selector to high with ", preset);
         qvReverb = 0;
+    } else if (row->length48000 == 0) {
+        reverbPresetGain = row->reverbPresetGain;
+        reverbLength = 1;
+        reverbIR = AlignedArray<float>(2);
+    } else {
+        reverbPresetGain = row->reverbPresetGain;
+        reverbLength = reverbFramesAt(source.sampleRate, row->length48000);
+        reverbIR = AlignedArray<float>(static_cast<std::size_t>(reverbLength) * 2);
+        source.loadingReverb = true;
+        source.qvReverb = preset;
+        source.reverbLength = reverbLength;
+        readWav(source, row->name, reverbIR.data(), reverbLength, 2);
     }
-    // Rooms are dry: no preset has a tail yet.
-    reverbLength = 0;
-    reverbPresetGain = 0.0f;
     logOutput("reverbLength = ", reverbLength);
     loadingReverb = false;
 }

@@ -15,8 +15,8 @@ class ReverbTail {
 public:
     /// Load time: reads a file. Sets length, samples and gain of a preset.
     /// @param preset  0..60; any other resets `qvReverb` to 0
-    /// @param source  data directory and packed file
-    void loadIReverb(std::int16_t preset, std::int16_t& qvReverb, const WavSource& source);
+    /// @param source  data directory, packed file and sample rate
+    void loadIReverb(std::int16_t preset, std::int16_t& qvReverb, WavSource source);
 
     /// The measured tail into both ears, low-passed if the room says so. Block time.
     /// @param bufferSize  floats behind `left` and `right`; samples beyond are dropped

@@ -15,13 +15,11 @@ namespace tessaly {
 namespace {
 
 constexpr int wallCount = 6;                          // the first records are the room's walls
-constexpr int firstMetricPreset = 13;                 // from here gains follow the path length
 constexpr double piShort = 3.14159265;                // as the angles were authored with
 constexpr double perPiShort = 0.31830988654751274;    // 1 / 3.14159265, not quite 1 / pi
 constexpr double perHalfTurn = 0.005555555555555556;  // 1 / 180
 constexpr float perHalfTurnSingle = 0.0055555557f;    // 1 / 180
 constexpr float noSuchPath = 1000000.0f;              // metres: a reflection that does not exist
-constexpr int steepestTheta = 75;                     // degrees, of a reflection
 
 float square(float value) noexcept { return std::pow(value, 2.0f); }
 
@@ -112,13 +110,11 @@ void reflectAtWall(ReflectionRecord& record, int k, float wall, const Scene& sce
                                      scene.sinDistance,    -scene.sinDistance};
     if (wall <= limits[k]) {
         markOutside(record);
-        if (k == 2) {
-            logTrace("Ref ", k, " cosDistance = ", limits[k],
-                     " out of Room, ReflectionDistance set to 1000000!");
-        } else {
-            logTrace("Ref ", k, k < 4 ? " cosDistance = " : " sinDistance = ", limits[k],
-                     " out of RoomWall ", wall, " ReflectionDistance set to 1000000!");
-        }
+        const bool side = k >= 4;
+        logTrace("Ref ", k, side ? " sinDistance = " : " cosDistance = ",
+                 side ? scene.sinDistance : scene.cosDistance,
+                 k == 2 ? " out of Room, ReflectionDistance set to 1000000!"
+                        : " out of RoomWall  ReflectionDistance set to 1000000!");
         return;
     }
     switch (k) {
@@ -148,15 +144,8 @@ std::int16_t clampTo(int angle, int limit) noexcept {
 }
 
 std::int16_t limitPhiOf(int phi, int limitPhi) noexcept {
-    if (limitPhi == 180) {
-        if (phi <= -180) {
-            return wrapToInt16(phi + 360);
-        }
-        if (phi > 180) {
-            return wrapToInt16(phi - 360);
-        }
-    }
-    return clampTo(phi, limitPhi);
+    const int turned = limitPhi == 180 ? turnedRound(phi) : phi;
+    return turned != phi ? wrapToInt16(turned) : clampTo(phi, limitPhi);
 }
 
 std::int16_t limitThetaOf(int theta, int limitTheta) noexcept {

@@ -1,4 +1,4 @@
-// The measured and the synthetic tail in a response, and the cut to the room's size.
+// Loading a tail, the measured and the synthetic one in a response, the cut to the room's size.
 #include "engine/reverb_tail.h"
 
 #include <gtest/gtest.h>
@@ -12,8 +12,12 @@
 #include <string>
 #include <vector>
 
+#include "base/ess_error.h"
 #include "engine/hrir_table_fixture.h"
+#include "engine/reverb_presets.h"
 #include "support/log_capture.h"
+#include "support/room_tables.h"
+#include "support/test_data.h"
 
 namespace tessaly::test {
 namespace {
@@ -281,32 +285,193 @@ TEST(ReverbTailCut, OddFactorsAndLengthsStayInsideTheBuffer) {
     EXPECT_EQ(weights(100000, 64, 0.5f)[63], 1.0) << "the cut lies behind the buffer";
 }
 
-TEST(ReverbTailLoad, RoomsAreDry) {
-    for (const std::int16_t preset : std::array<std::int16_t, 5>{0, 1, 2, 15, 60}) {
-        const LogCapture log;
-        ReverbTail tail;
-        std::int16_t qvReverb = preset;
-        tail.loadIReverb(preset, qvReverb, WavSource{});
-        EXPECT_EQ(tail.reverbLength, 0);
-        EXPECT_TRUE(tail.reverbIR.empty());
-        EXPECT_FALSE(tail.loadingReverb);
-        EXPECT_EQ(qvReverb, preset);
-        const std::vector<std::string> expected = {
-            "", "___loadIReverb " + std::to_string(preset) + " now...", "reverbLength = 0"};
-        EXPECT_EQ(log.outputLines(), expected);
+// ---- Loading ----
+
+class ReverbTailLoad : public ::testing::Test {
+protected:
+    ReverbTailLoad() { essError = essErrorNone; }
+    ~ReverbTailLoad() override { essError = essErrorNone; }
+
+    WavSource sourceAt(int rate) const {
+        WavSource source;
+        source.bundleBasePath = directory.path();
+        source.IRfilePath = directory.file(rate == 44100   ? "/TSLdata510.dat"
+                                           : rate == 48000 ? "/TSLdata511.dat"
+                                                           : "/TSLdata512.dat");
+        source.sampleRate = rate;
+        return source;
+    }
+    void load(int preset, int rate = 48000) {
+        qvReverb = static_cast<std::int16_t>(preset);
+        log.clear();
+        tail = ReverbTail{};
+        tail.loadIReverb(qvReverb, qvReverb, sourceAt(rate));
+    }
+    static std::string intro(int preset) {
+        return "___loadIReverb " + std::to_string(preset) + " now...";
+    }
+
+    TempDirectory directory;
+    LogCapture log;
+    ReverbTail tail;
+    std::int16_t qvReverb = 0;
+};
+
+TEST_F(ReverbTailLoad, EveryTailHasItsLengthAndGainAtEveryRate) {
+    for (const int rate : sampleRates) {
+        writePackedTails(directory.path(), rate, {});
+        for (const TailLine& line : readTailLines()) {
+            if (line.length48000 == 0) {
+                continue;
+            }
+            load(line.preset, rate);
+            const int frames = line.frames[rate == 24000 ? 0u : rate == 44100 ? 1u : 2u];
+            EXPECT_EQ(tail.reverbLength, frames) << line.preset;
+            EXPECT_EQ(tail.reverbIR.size(), 2 * static_cast<std::size_t>(frames));
+            EXPECT_EQ(tail.reverbPresetGain, line.gain) << line.preset;
+            EXPECT_EQ(qvReverb, line.preset);
+            EXPECT_FALSE(tail.loadingReverb);
+            EXPECT_EQ(log.outputLines(),
+                      (std::vector<std::string>{"", intro(line.preset),
+                                                "reverbLength = " + std::to_string(frames)}));
+        }
+        EXPECT_EQ(essError, essErrorNone);
     }
 }
 
-TEST(ReverbTailLoad, PresetsBeyondTheTableTurnTheTailOff) {
-    for (const std::int16_t preset : std::array<std::int16_t, 3>{61, -1, 32767}) {
-        const LogCapture log;
-        ReverbTail tail;
-        std::int16_t qvReverb = preset;
-        tail.loadIReverb(preset, qvReverb, WavSource{});
+TEST_F(ReverbTailLoad, SamplesOfThePackedFileStandAsTheyAre) {
+    for (const int rate : sampleRates) {
+        // The second in the file is the one before it in the list: the index decides.
+        writePackedTails(directory.path(), rate, {52, 20, 41});
+        for (const int preset : {20, 41, 52}) {
+            load(preset, rate);
+            ASSERT_EQ(essError, essErrorNone);
+            for (int i = 0; i < tail.reverbLength; ++i) {
+                for (int ear : {0, 1}) {
+                    ASSERT_EQ(tailFrame(tail, ear, i), testTailSample(preset, i, ear))
+                        << preset << " at " << rate << ": " << i << " ear " << ear;
+                }
+            }
+        }
+    }
+}
+
+TEST_F(ReverbTailLoad, PresetsBelowFifteenAreOnePairOfZeros) {
+    for (const TailLine& line : readTailLines()) {
+        if (line.length48000 != 0) {
+            continue;
+        }
+        load(line.preset);
+        EXPECT_EQ(tail.reverbLength, 1) << line.preset;
+        EXPECT_EQ(tail.reverbPresetGain, line.gain) << line.preset;
+        ASSERT_EQ(tail.reverbIR.size(), 2u);
+        EXPECT_EQ(tail.reverbIR[0], 0.0f);
+        EXPECT_EQ(tail.reverbIR[1], 0.0f);
+        EXPECT_EQ(qvReverb, line.preset);
+        EXPECT_EQ(log.outputLines(),
+                  (std::vector<std::string>{"", intro(line.preset), "reverbLength = 1"}));
+    }
+    EXPECT_EQ(essError, essErrorNone) << "no file is opened";
+}
+
+TEST_F(ReverbTailLoad, ZeroSaysThatNothingIsSelected) {
+    tail.reverbLength = 7;
+    tail.reverbPresetGain = 0.25f;
+    tail.loadIReverb(0, qvReverb, sourceAt(48000));
+    EXPECT_EQ(tail.reverbLength, 0);
+    EXPECT_EQ(tail.reverbPresetGain, 0.25f) << "not set";
+    EXPECT_TRUE(tail.reverbIR.empty());
+    EXPECT_EQ(log.outputLines(),
+              (std::vector<std::string>{"", intro(0), "reverb activ, but no Filter selected!!!",
+                                        "reverbLength = 0"}));
+}
+
+TEST_F(ReverbTailLoad, PresetsBeyondTheTableTurnTheTailOff) {
+    for (const int preset : {61, -1, 32767, -32768}) {
+        load(preset);
         EXPECT_EQ(qvReverb, 0);
-        EXPECT_EQ(
-            log.count(LogStream::output, "reverb selector to high with " + std::to_string(preset)),
-            1u);
+        EXPECT_EQ(tail.reverbLength, 0);
+        EXPECT_TRUE(tail.reverbIR.empty());
+        EXPECT_EQ(log.outputLines(),
+                  (std::vector<std::string>{
+                      "", intro(preset), "reverb selector to high with " + std::to_string(preset),
+                      "reverbLength = 0"}));
+    }
+    EXPECT_EQ(essError, essErrorNone);
+}
+
+TEST_F(ReverbTailLoad, MissingFileIsAnErrorAndASilentTail) {
+    load(15, 44100);
+    EXPECT_EQ(essError, essErrorTailUnreadable);
+    EXPECT_EQ(tail.reverbLength, 21266);
+    EXPECT_EQ(tail.reverbPresetGain, 0.05306f);
+    EXPECT_TRUE(std::all_of(tail.reverbIR.begin(), tail.reverbIR.end(),
+                            [](float sample) { return sample == 0.0f; }));
+    const std::string line =
+        "Tessaly_e ERROR: Wav " + directory.file("/TSLdata510.dat") + " not readable!!!!";
+    EXPECT_EQ(log.errorLines(), std::vector<std::string>{line});
+    EXPECT_EQ(log.count(LogStream::output, line), 1u);
+    EXPECT_FALSE(tail.loadingReverb);
+}
+
+TEST_F(ReverbTailLoad, ShortFileLeavesTheRestSilent) {
+    constexpr int stored = 100;
+    std::vector<char> bytes(242, '\0');
+    for (int i = 0; i < stored; ++i) {
+        for (const float sample : {0.5f, -0.25f}) {
+            const auto* const raw = reinterpret_cast<const char*>(&sample);
+            bytes.insert(bytes.end(), raw, raw + sizeof sample);
+        }
+    }
+    bytes.insert(bytes.end(), {'\x7f', '\x7f'});  // half a sample more
+    writeFile(directory.file("/TSLdata511.dat"), bytes);
+    load(20);
+    EXPECT_EQ(essError, essErrorNone);
+    ASSERT_EQ(tail.reverbLength, 4096);
+    EXPECT_EQ(tailFrame(tail, 0, stored - 1), 0.5f);
+    EXPECT_EQ(tailFrame(tail, 1, stored - 1), -0.25f);
+    for (int i = stored + 1; i < 4096; ++i) {
+        ASSERT_EQ(tailFrame(tail, 0, i), 0.0f) << i;
+        ASSERT_EQ(tailFrame(tail, 1, i), 0.0f) << i;
+    }
+}
+
+TEST_F(ReverbTailLoad, WrongIndexReadsNothing) {
+    std::vector<char> bytes(242 + 4096 * 8, '\x3c');
+    for (const std::int32_t start : {2147483647, -2147483647, 5000, -40}) {
+        const auto* const raw = reinterpret_cast<const char*>(&start);
+        std::copy(raw, raw + sizeof start, bytes.begin() + 2 + 4 * (20 - 1));
+        writeFile(directory.file("/TSLdata511.dat"), bytes);
+        load(20);
+        EXPECT_EQ(essError, essErrorNone);
+        EXPECT_TRUE(std::all_of(tail.reverbIR.begin(), tail.reverbIR.end(), [](float sample) {
+            return sample == 0.0f;
+        })) << start;
+    }
+    for (const std::size_t size : {0u, 2u, 79u}) {
+        writeFile(directory.file("/TSLdata511.dat"), std::vector<char>(size, '\0'));
+        load(20);
+        EXPECT_EQ(tail.reverbIR[0], 0.0f);
+    }
+}
+
+TEST_F(ReverbTailLoad, OneFileATailIsReadByItsNameAndRate) {
+    for (const int rate : sampleRates) {
+        WavSource source = sourceAt(rate);
+        source.usePackedDatabase = false;
+        const std::string name =
+            directory.file("/Bin_Small Livingroom_V02_" + std::to_string(rate) + ".wav");
+        const auto frames = static_cast<std::size_t>(reverbFramesAt(rate, 22268));
+        std::vector<float> pairs(2 * frames);
+        for (std::size_t i = 0; i < pairs.size(); ++i) {
+            pairs[i] = testTailSample(23, static_cast<int>(i / 2), static_cast<int>(i % 2));
+        }
+        writeWavForReader(name, 2, rate, pairs);
+        tail = ReverbTail{};
+        tail.loadIReverb(23, qvReverb, source);
+        EXPECT_EQ(essError, essErrorNone);
+        ASSERT_EQ(tail.reverbIR.size(), pairs.size());
+        EXPECT_TRUE(std::equal(pairs.begin(), pairs.end(), tail.reverbIR.begin()));
     }
 }
 

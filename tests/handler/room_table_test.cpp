@@ -7,19 +7,19 @@
 #include <cstdint>
 #include <limits>
 #include <set>
+#include <vector>
+
+#include "support/room_tables.h"
 
 namespace {
 
 using tessaly::roomPresetFor;
 
 TEST(RoomTable, FollowsTheMenu) {
-    // Typed from the menu, one room after the other.
-    const int menu[] = {0,  0,  11, 0,  30, 16, 59, 60, 54, 25, 26, 47, 24, 17, 53, 0,  28, 57,
-                        56, 55, 15, 21, 23, 58, 27, 18, 51, 20, 52, 41, 19, 22, 29, 33, 0,  42,
-                        49, 34, 40, 32, 43, 48, 38, 35, 44, 39, 36, 46, 45, 31, 37, 50, 0};
-    ASSERT_EQ(std::size(menu), 53u);
+    const std::vector<int> menu = tessaly::test::readRoomMenu();
+    ASSERT_EQ(menu.size(), 53u);
     for (int room = 0; room < 53; ++room) {
-        EXPECT_EQ(roomPresetFor(room), menu[room]) << "room " << room;
+        EXPECT_EQ(roomPresetFor(room), menu[static_cast<std::size_t>(room)]) << "room " << room;
     }
 }
 

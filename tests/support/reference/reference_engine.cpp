@@ -7,6 +7,7 @@
 
 #include "base/numeric_conversion.h"
 #include "base/precision.h"
+#include "support/reference/reference_rooms.h"
 
 namespace tessaly::reference {
 
@@ -190,10 +191,25 @@ void Engine::stepBookkeeping() {
 }
 
 void Engine::updateReflections() {
-    // Records follow the source by their fixed offsets; rooms with walls are not modelled.
+    constexpr int wallCount = 6;
+    const WallScene scene{phi_,
+                          theta_,
+                          distance_,
+                          samplesPerMetre_,
+                          controls.roomSizeFactor,
+                          earlyFlexRefPreset_,
+                          controls.roomDistances};
+    int k = -1;
     for (ReflectionRecord& record : records) {
-        record.phi = wrapToInt16(record.relativePhi + phi_);
-        if (earlyFlexRefPreset_ >= 13) {
+        ++k;
+        const bool wall = options_.auralisation && k < wallCount;
+        if (wall && !reflectAtWall(record, k, scene)) {
+            continue;
+        }
+        if (!wall || k < 2) {
+            record.phi = wrapToInt16(record.relativePhi + phi_);
+        }
+        if (!options_.auralisation && earlyFlexRefPreset_ >= 13) {
             const float gain = samplesPerMetre_ / (static_cast<float>(record.delaySamples) +
                                                    samplesPerMetre_ * distance_);
             record.distanceGain = gain > 1.0f ? 1.0f : gain;

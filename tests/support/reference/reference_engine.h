@@ -114,6 +114,7 @@ struct EngineOptions {
     int earlyFlexRefPreset = 0;
     int sampleRate = 48000;
     int defaultFirSize = 4096;
+    bool auralisation = false;
     bool doppler = false;
     bool bypass3DAudio = false;
 

@@ -88,6 +88,7 @@ void Handler::load(int sampleRate, int blockSize) {
     options.blockLength = wrapToInt16(blockSize);
     options.sampleRate = sampleRate;
     options.fading = fadingIn_;
+    options.auralisation = auralisationIn_;
     options.doppler = dopplerIn_;
     options.bypass3DAudio = bypass3DAudioIn_;
     options.alwaysUpdateFilter = alwaysUpdateFilter;
