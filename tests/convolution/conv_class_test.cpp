@@ -339,6 +339,21 @@ TEST_F(ConvClass, CrossfadeBlockLeavesTheFirstRingAsItWas) {
     EXPECT_EQ(rig.second->FDL[2][3].re, 0.0f);
 }
 
+TEST_F(ConvClass, FirstInstanceTransformsNoInputInACrossfadeBlock) {
+    ConvolverRig rig(16, 2);
+    rig.makeBoth();
+    rig.feed(Noise(15).samples(16));
+    rig.secondOLSactive = true;
+    rig.first->FDLpos = 0;
+    rig.first->FDL[0][5] = {3.0f, 4.0f};  // stands for what the second instance left there
+    rig.first->process();
+    EXPECT_EQ(rig.first->FDL[0][5].re, 3.0f);
+    EXPECT_EQ(rig.first->FDL[0][5].im, 4.0f);
+    rig.second->FDLpos = 0;
+    rig.second->process();
+    EXPECT_NE(rig.second->FDL[0][5].re, 0.0f) << "the second one does";
+}
+
 TEST_F(ConvClass, UnchangedPartitionsKeepTheirSpectraAndChangedOnesDoNot) {
     ConvolverRig rig(16, 3);
     rig.makeFirst();
