@@ -19,6 +19,7 @@ constexpr double fitTo = -25.0;          // dB
 constexpr double densityWindow = 20e-3;  // s
 constexpr double gaussianShare = 0.3173;
 constexpr std::size_t lastFrames = 60;
+constexpr double lowestInOctave = 0.59460355750136051;  // 2^-0.75: where an octave's skirt ends
 
 /// Sums of auto and cross spectra in octaves.
 class CoherenceSums {
@@ -98,7 +99,7 @@ std::size_t frameAt(double seconds, int sampleRate) noexcept {
 
 /// Points of a backward integral from the onset to the end.
 std::size_t curveStep(std::size_t frames) noexcept {
-    return std::max<std::size_t>(1, frames / 4000);
+    return std::max<std::size_t>(1, frames / 2000);
 }
 
 }  // namespace
@@ -167,11 +168,13 @@ OctaveTimes measuredTimes(const std::vector<float>& tail,
         }
         transform.forward(time.data(), spectrum.data());
         for (std::size_t octave = 0; octave < decayOctaves; ++octave) {
-            for (std::size_t k = 0; k < part.size(); ++k) {
+            const double centre = octaveCentre(octave);
+            std::fill(part.begin(), part.end(), Complex());
+            const auto first = static_cast<std::size_t>(centre * lowestInOctave / binHertz) + 1;
+            const auto last = static_cast<std::size_t>(centre / lowestInOctave / binHertz);
+            for (std::size_t k = first; k <= std::min(last, part.size() - 1); ++k) {
                 const double hertz = static_cast<double>(k) * binHertz;
-                const double weight =
-                    k == 0 ? 0.0 : octaveWeight(std::log2(hertz / octaveCentre(octave)));
-                part[k] = spectrum[k] * weight;
+                part[k] = spectrum[k] * octaveWeight(std::log2(hertz / centre));
             }
             transform.inverse(part.data(), time.data());
             energies[octave].resize(frames);
@@ -206,8 +209,8 @@ OctaveTimes designedTimes(std::size_t frames, int sampleRate, const TailDesign& 
         for (std::size_t i = frameAt(design.onsetSeconds, sampleRate); i < frames; i += step) {
             curve.push_back(0.0);
         }
-        const double low = centre * std::exp2(-0.75);
-        const double high = std::min(centre * std::exp2(0.75), 0.5 * sampleRate);
+        const double low = centre * lowestInOctave;
+        const double high = std::min(centre / lowestInOctave, 0.5 * sampleRate);
         for (int point = 0; point < points; ++point) {
             const double hertz = low + (high - low) * (point + 0.5) / points;
             const double weight = octaveWeight(std::log2(hertz / centre));
