@@ -8,6 +8,7 @@
 
 #include "base/ess_error.h"
 #include "base/log.h"
+#include "base/process_lifetime.h"
 #include "convolution/simd/kernels.h"
 
 namespace tessaly {
@@ -29,8 +30,8 @@ struct KeptSpectra {
 };
 
 KeptSpectra& keptSpectra() noexcept {
-    static KeptSpectra kept;
-    return kept;
+    static ProcessLifetime<KeptSpectra> kept;
+    return *kept;
 }
 
 void allocKeptSpectrum(ComplexBin*& slot, std::int32_t count) noexcept {

@@ -4,6 +4,7 @@
 #include <memory>
 #include <vector>
 
+#include "base/process_lifetime.h"
 #include "convolution/conv_class.h"
 
 namespace tessaly {
@@ -20,18 +21,14 @@ namespace {
 
 /// Every filter ever loaded. A replaced one stays: convolvers of other engines compare and read
 /// the old pointer until their own next block.
-std::vector<std::unique_ptr<float[]>>& headphoneFilters() {
-    static std::vector<std::unique_ptr<float[]>> filters;
-    return filters;
-}
+constinit ProcessLifetime<std::vector<std::unique_ptr<float[]>>> headphoneFilters;
 
 }  // namespace
 
 void allocateHpTFfilter(int length) {
-    auto& filters = headphoneFilters();
-    filters.push_back(std::make_unique<float[]>(static_cast<std::size_t>(length)));
+    headphoneFilters->push_back(std::make_unique<float[]>(static_cast<std::size_t>(length)));
     hpTFtimeLength = length;
-    hpTFfilter = filters.back().get();
+    hpTFfilter = headphoneFilters->back().get();
 }
 
 void resetSharedEngineState() {
@@ -43,7 +40,7 @@ void resetSharedEngineState() {
     qvHpTFcompSelect = 0;
     hpTFfilter = nullptr;
     hpTFtimeLength = 0;
-    headphoneFilters().clear();
+    headphoneFilters->clear();
 }
 
 }  // namespace tessaly

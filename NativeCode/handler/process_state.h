@@ -12,7 +12,7 @@ namespace tessaly {
 
 /// Directory of the data files, no trailing slash. Written by the exported path functions, read
 /// by a handler's load only.
-extern std::string bundleBasePath;
+extern std::string& bundleBasePath;
 /// A path was given once in which the data files were found. Written with `bundleBasePath`; until
 /// then no handler loads.
 extern constinit bool assetPathSet;

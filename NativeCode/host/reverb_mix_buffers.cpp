@@ -4,10 +4,17 @@
 #include <algorithm>
 
 #include "base/log.h"
+#include "base/process_lifetime.h"
 
 namespace tessaly {
 
-std::map<std::int32_t, ReverbMixBuffer> reverbmixbuffermap;
+namespace {
+
+ProcessLifetime<std::map<std::int32_t, ReverbMixBuffer>> mixBuffers;
+
+}  // namespace
+
+std::map<std::int32_t, ReverbMixBuffer>& reverbmixbuffermap = *mixBuffers;
 
 ReverbMixBuffer* findMixBuffer(std::int32_t id) noexcept {
     const auto entry = reverbmixbuffermap.find(id);

@@ -19,7 +19,7 @@ using ReverbMixBuffer = std::array<float, 2 * mixBufferFrames>;
 /// Mix buffers by reverb ID. Entries are made, moved and erased by the reverbs' "ReverbID" and
 /// release, on the host's calling thread; sources add and reverbs take on the mixer's thread.
 /// Not guarded: the host's scheduling keeps them apart. A node stays where it is for life.
-extern std::map<std::int32_t, ReverbMixBuffer> reverbmixbuffermap;
+extern std::map<std::int32_t, ReverbMixBuffer>& reverbmixbuffermap;
 
 /// Looks an ID up without creating it. Block time. @return null if no reverb has taken the ID
 ReverbMixBuffer* findMixBuffer(std::int32_t id) noexcept TESSALY_NONBLOCKING;

@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "base/aligned_array.h"
+#include "base/process_lifetime.h"
 
 namespace tessaly {
 
@@ -19,8 +20,8 @@ namespace {
 
 // Held until the process ends: engines of other handlers compose from these at any time, long
 // after the engine that loaded them has gone.
-constinit AlignedArray<float> streamOwner;
-constinit std::vector<AlignedArray<float>> entryOwners;
+constinit ProcessLifetime<AlignedArray<float>> streamOwner;
+constinit ProcessLifetime<std::vector<AlignedArray<float>>> entryOwners;
 
 }  // namespace
 
@@ -45,7 +46,7 @@ void replaceHrirStream(int hrirLength) {
         hrirTable[k] = stream.data() + k * stride;
     }
     HRTFStream = stream.data();
-    streamOwner = std::move(stream);
+    *streamOwner = std::move(stream);
 }
 
 HrirSlot appendHrir(int hrirLength) {
@@ -54,7 +55,7 @@ HrirSlot appendHrir(int hrirLength) {
     }
     const auto frames = static_cast<std::size_t>(std::max(hrirLength, hrirMaxLength));
     HrirSlot entry = &hrirTable[nextFreeHrir];
-    *entry = entryOwners.emplace_back(frames * 2).data();
+    *entry = entryOwners->emplace_back(frames * 2).data();
     ++nextFreeHrir;
     return entry;
 }
@@ -65,8 +66,8 @@ void resetHrirTables() {
     HRTFStream = nullptr;
     nextFreeHrir = 0;
     databaseBypassMode = 0;
-    streamOwner = {};
-    entryOwners.clear();
+    *streamOwner = {};
+    entryOwners->clear();
 }
 
 }  // namespace tessaly
