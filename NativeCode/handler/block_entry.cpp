@@ -15,6 +15,8 @@ namespace tessaly {
 
 namespace {
 
+constexpr float highestInputChannel = 1e6f;  // 1 is the right channel alone
+
 /// Exponents this near to 1 leave the angle as it is; compared in double.
 constexpr double plainExponentFrom = 0.99;
 constexpr double plainExponentTo = 1.01;
@@ -155,13 +157,14 @@ void InstanceHandler::updateLiveControls(SpatialEngine& engine) noexcept {
     controls.roomSizeFactor = roomSize;
     if (auralisation && roomDistancesSet) {
         controls.roomDistances = roomDistances;
+        logTrace("Set tessCore_RoomGeo front ", controls.roomDistances[2]);
     }
 }
 
 void InstanceHandler::renderBlock(
     const float* in, float* out, std::uint32_t length, int inchannels, int outchannels) noexcept {
     const std::size_t wanted = floatsIn(length, outchannels);
-    if (length > blockCapacity) {
+    if (blockCapacity == 0 || length > blockCapacity) {
         if (!overlongReported) {
             logError("Tessaly_h: ERROR block of ", length, " frames is longer than blocklenght ",
                      blocklenght);
@@ -197,9 +200,9 @@ void InstanceHandler::fillInputBlock(const float* in,
         }
         return;
     }
-    // What is no number would stay in the engine's recursive filters for good, so it takes the
-    // left channel too.
-    if (inputChannel <= -1.0f || !std::isfinite(inputChannel)) {
+    // What is no number, or overflows, would stay in the engine's recursive filters for good, so it
+    // takes the left channel too.
+    if (inputChannel <= -1.0f || !(inputChannel <= highestInputChannel)) {
         const std::size_t held = std::min(floatsIn(length, inchannels), inputStorage.size());
         std::copy_n(in, std::min(floatsIn(length, outchannels), held), inputBlock);
         return;

@@ -52,9 +52,10 @@ int TESSALY_HOST_CALL getFloatBufferStub(UnityAudioEffectState* state,
                                          float* buffer,
                                          int numsamples);
 
-/// The host's block size in frames, 0 if its record ends before it. Block time.
+/// The host's block size in frames, 0 if its record ends before it or is too old to have it.
+/// Block time.
 inline int hostBlockSize(const UnityAudioEffectState& state) noexcept {
-    return state.structsize >= spatializerStateSize ? static_cast<int>(state.dspbuffersize) : 0;
+    return hasSpatializerFields(state) ? static_cast<int>(state.dspbuffersize) : 0;
 }
 
 }  // namespace tessaly

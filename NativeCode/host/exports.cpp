@@ -32,7 +32,8 @@ bool storeAssetPath(const char* prefix, const std::string& firstPath, std::strin
     const std::string candidate = pathCopy + databaseProbe;
     const bool exists = std::ifstream(candidate).good();
     if (!exists) {
-        logTrace(prefix, "file ", candidate, " does not exists!");
+        // Both families say this with the spatializer's prefix.
+        logTrace("Tessaly_s: ", "file ", candidate, " does not exists!");
         return false;
     }
     logTrace(prefix, "file ", candidate, " exists!");

@@ -21,6 +21,9 @@ constinit std::uint32_t processTick = 0;
 
 namespace {
 
+/// 240 dB, far above what parameters within their ranges can add up to.
+constexpr float highestSendGain = 1e12f;
+
 using namespace spatializer;
 
 SpatializerEffect* effectOf(UnityAudioEffectState* state) noexcept {
@@ -161,8 +164,9 @@ void sendToReverbs(SpatializerEffect& effect,
             continue;
         }
         const float gain = decibelsToLinear(send.levelDb) * reverbGain * masterGain * distanceGain;
-        // One source without a proper level must not spoil the reverb of all others.
-        if (std::isfinite(gain)) {
+        // One source without a proper level must not spoil the reverb of all others: whatever is
+        // no number, or would overflow on its way through the return, is dropped.
+        if (std::fabs(gain) <= highestSendGain) {
             addToMixBuffer(*mix, in, length, inchannels, gain);
         }
     }

@@ -323,7 +323,7 @@ TEST_F(BlockEntryTest, ChannelsAreBlended) {
 }
 
 TEST_F(BlockEntryTest, AnInputChannelThatIsNoNumberTakesTheLeft) {
-    for (const float channel : {nan, infinity, -infinity}) {
+    for (const float channel : {nan, infinity, -infinity, 3e38f}) {
         handler.inputChannel = channel;
         const std::vector<float> in = counted(2 * frames);
         run(in, 2);

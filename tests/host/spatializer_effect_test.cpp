@@ -567,7 +567,8 @@ TEST_F(SpatializerEffectTest, AMutedSourceStillSends) {
 }
 
 TEST_F(SpatializerEffectTest, ALevelThatIsNoNumberDoesNotReachTheReverb) {
-    for (const float value : {nan, infinity}) {
+    // 770 dB is a finite factor of 3e38: it would overflow one step further on.
+    for (const float value : {nan, infinity, 770.0f}) {
         for (const int index : {static_cast<int>(P_GAIN), static_cast<int>(P_REVERB),
                                 static_cast<int>(P_REVERB_SEND)}) {
             SCOPED_TRACE(index);
@@ -579,7 +580,7 @@ TEST_F(SpatializerEffectTest, ALevelThatIsNoNumberDoesNotReachTheReverb) {
             set(index, value);
             run(countedSamples(2 * frames), 2);
             for (const float sample : reverbmixbuffermap[5]) {
-                ASSERT_TRUE(std::isfinite(sample));
+                ASSERT_LT(std::fabs(sample), 1e6f);
             }
             set(P_GAIN, 0.0f);
             set(P_REVERB, 0.0f);
