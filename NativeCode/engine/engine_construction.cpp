@@ -1,5 +1,6 @@
 // An engine's life at its two ends: construction in order, `Stop`, destruction.
 #include <cmath>
+#include <new>
 #include <utility>
 
 #include "base/ess_error.h"
@@ -312,7 +313,14 @@ SpatialEngine::SpatialEngine(std::string instanceName,
     state.distanceIn = distanceIn;
     state.gainDb = gainDb;
 
-    constructEngine(state);
+    try {
+        constructEngine(state);
+    } catch (const std::bad_alloc&) {
+        // No exception leaves the library. The engine renders silence, and so does the process
+        // while the code stands.
+        logOutput("!!!Not enough memory!!!");
+        essError = essErrorSpectrumMemory;
+    }
     if (state.complete) {
         Stop();
     }

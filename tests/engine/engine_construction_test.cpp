@@ -60,6 +60,39 @@ TEST_F(EngineConstruction, AMissingDatabaseStops) {
     EXPECT_EQ(log.count(LogStream::output, "Tessaly_e ERROR: file not found "), 1u);
 }
 
+TEST_F(EngineConstruction, WithoutATransformPlanItStopsBehindTheConvolvers) {
+    writeSets();
+    spectralFaults.plansLeft = 0;
+    EngineRig rig(directory.path(), 48000, 256);
+    LogCapture log;
+    rig.build();
+    spectralFaults = {};
+    EXPECT_EQ(essError, essErrorTransformPlan);
+    EXPECT_NE(rig.state().firstOLS, nullptr);
+    EXPECT_FALSE(rig.state().complete);
+    EXPECT_EQ(log.count(LogStream::output, "couldn't load FFT Plan"), 1u);
+    EXPECT_EQ(log.count(LogStream::output, "___tessCore_Stop"), 0u);
+    std::fill(rig.output.begin(), rig.output.end(), 1.0f);
+    rig.run();
+    EXPECT_EQ(rig.output, std::vector<float>(rig.output.size(), 0.0f));
+}
+
+TEST_F(EngineConstruction, WithoutMemoryForSpectraItIsAnErrorAndSilent) {
+    writeSets();
+    spectralFaults.spectraLeft = 0;
+    EngineRig rig(directory.path(), 48000, 256);
+    rig.build();
+    spectralFaults = {};
+    EXPECT_EQ(essError, essErrorSpectrumMemory);
+    std::fill(rig.input.begin(), rig.input.end(), 0.5f);
+    rig.run();
+    essError = essErrorNone;
+    rig.run();
+    for (const float sample : rig.output) {
+        EXPECT_EQ(sample, 0.0f);
+    }
+}
+
 TEST_F(EngineConstruction, AStoppedEngineCanBeAskedForAnything) {
     const struct {
         int rate;

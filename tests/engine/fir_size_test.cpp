@@ -63,7 +63,7 @@ TEST(FirSize, TheSyntheticTailKeepsTheDefault) {
 }
 
 TEST(FirSize, ReflectionsAloneTakeTheRoomsSize) {
-    // Independently typed from the room lists.
+    // By size, so that the table has a second form.
     const std::map<int, std::vector<int>> bySize = {
         {1024, {1, 2, 3, 9, 20, 52}},
         {2048, {4, 11, 15, 17, 18, 23, 28, 41, 51, 53, 55, 56}},

@@ -56,7 +56,8 @@ TEST(OutputStage, CrossfadesTheFirstSixtyFourSamplesOnly) {
             EXPECT_NEAR(stage.firstOutLeft[i],
                         (1.0f - up) * before.secondOutLeft[i] + up * before.firstOutLeft[i], 1e-5);
             EXPECT_NEAR(stage.firstOutRight[i],
-                        (1.0f - up) * before.secondOutRight[i] + up * before.firstOutRight[i], 1e-5);
+                        (1.0f - up) * before.secondOutRight[i] + up * before.firstOutRight[i],
+                        1e-5);
         } else {
             EXPECT_EQ(stage.firstOutLeft[i], before.firstOutLeft[i]) << i;
             EXPECT_EQ(stage.firstOutRight[i], before.firstOutRight[i]) << i;
