@@ -3,12 +3,13 @@
 #include <unistd.h>
 
 #include <algorithm>
-#include <cmath>
 #include <csignal>
 #include <cstdio>
 #include <exception>
+#include <filesystem>
 #include <optional>
 #include <stdexcept>
+#include <system_error>
 
 #include "demo_sounds/demo_sounds.h"
 #include "demo_sounds/sound_file.h"
@@ -165,10 +166,20 @@ void listQuietly(const RenderOptions& options) {
     fmt::print("{}", listing(library));
 }
 
+void refuseToOverwriteInput(const RenderOptions& options) {
+    std::error_code ignored;
+    if (!options.input.empty() &&
+        std::filesystem::equivalent(options.input, options.output, ignored)) {
+        throw std::runtime_error(
+            fmt::format("{} is the input and cannot be the output too", options.output.string()));
+    }
+}
+
 void renderToFiles(const RenderOptions& options) {
     // Everything that can be refused is refused before the work begins.
     PluginLibrary::locate(options.library);
-    checkData(options.dataDirectory, options.sampleRate);
+    checkData(options.dataDirectory, options.sampleRate, options.room);
+    refuseToOverwriteInput(options);
     PendingFile sound(options.output);
     std::optional<PendingFile> picture;
     if (!options.picture.empty()) {
@@ -224,5 +235,6 @@ int run(int argumentCount, char** arguments) {
 int main(int argumentCount, char** arguments) {
     std::signal(SIGINT, tessaly::onSignal);
     std::signal(SIGTERM, tessaly::onSignal);
+    std::signal(SIGHUP, tessaly::onSignal);
     return tessaly::run(argumentCount, arguments);
 }

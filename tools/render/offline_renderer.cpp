@@ -5,15 +5,19 @@
 
 #include <algorithm>
 #include <cmath>
+#include <cstring>
 #include <stdexcept>
 
 #include "base/ess_error.h"
 #include "minihost/effect_instance.h"
+#include "render/rooms.h"
 #include "render/text_numbers.h"
 
 namespace tessaly {
 
 namespace {
+
+constexpr int firstPresetWithTail = 15;
 
 const char* meaningOf(int errorState) {
     switch (errorState) {
@@ -108,7 +112,7 @@ void fillBlock(const Sound& input, std::size_t start, std::vector<float>& block)
 
 }  // namespace
 
-void checkData(const std::filesystem::path& directory, int sampleRate) {
+void checkData(const std::filesystem::path& directory, int sampleRate, int room) {
     std::error_code ignored;
     if (!std::filesystem::is_directory(directory, ignored)) {
         throw std::runtime_error("no data directory " + directory.string() +
@@ -117,6 +121,14 @@ void checkData(const std::filesystem::path& directory, int sampleRate) {
     const char* ofRate = sampleRate == 44100   ? "TSLdata120.dat"
                          : sampleRate == 48000 ? "TSLdata121.dat"
                                                : "TSLdata122.dat";
+    const Room& wanted = roomAt(room);
+    const std::string tails = fmt::format("TSLdata51{}.dat", ofRate[std::strlen("TSLdata12")]);
+    if (wanted.preset >= firstPresetWithTail &&
+        !std::filesystem::is_regular_file(directory / tails, ignored)) {
+        throw std::runtime_error(fmt::format("no tail for room {} ({}) at {} Hz: {} is missing",
+                                             room, wanted.name, sampleRate,
+                                             (directory / tails).string()));
+    }
     // The library asks for the file of 44100 Hz whatever the rate.
     for (const char* name : {ofRate, "TSLdata120.dat"}) {
         if (!std::filesystem::is_regular_file(directory / name, ignored)) {

@@ -34,9 +34,9 @@ struct RenderResult {
     std::uint64_t releases = 0;     ///< likewise
 };
 
-/// Looks for the files that the rate needs, so that a missing one is told by name.
+/// Looks for the files that rate and room need, so that a missing one is told by name.
 /// @throws std::runtime_error with one line
-void checkData(const std::filesystem::path& directory, int sampleRate);
+void checkData(const std::filesystem::path& directory, int sampleRate, int room);
 
 /// Renders the job.
 /// @param onBlock  called before each block with the part done, 0 to 1; may throw to stop

@@ -197,6 +197,24 @@ TEST_F(RenderProgram, BadRequestsAreRefusedInOneLine) {
     expectRefused(render({"--radius", "wide"}), "--radius needs a number");
 }
 
+TEST_F(RenderProgram, ARoomWithoutItsTailFileIsRefusedByName) {
+    expectRefused(render({"--room", "4"}), "TSLdata511.dat is missing");
+    EXPECT_EQ(render({"--room", "2"}).exitCode, 0) << "reflections only";
+}
+
+TEST_F(RenderProgram, TheInputIsNeverTheOutput) {
+    ASSERT_EQ(render({}).exitCode, 0);
+    const std::string sound = inFolder("out.wav");
+    const auto before = std::filesystem::file_size(sound);
+    std::filesystem::create_symlink(sound, folder / "link.wav");
+    for (const std::string& input : {sound, inFolder("link.wav")}) {
+        const ProgramRun refused = run({input, "-o", sound, "--duration", "0.1"});
+        EXPECT_NE(refused.exitCode, 0);
+        EXPECT_THAT(refused.errors, HasSubstr("is the input and cannot be the output too"));
+        EXPECT_EQ(std::filesystem::file_size(sound), before);
+    }
+}
+
 TEST_F(RenderProgram, MissingFilesAreRefusedInOneLine) {
     expectRefused(run({inFolder("none.wav"), "-o", inFolder("out.wav")}), "none.wav");
     expectRefused(run({inFolder("data/TSLdata120.dat"), "-o", inFolder("out.wav")}), "cannot read");
