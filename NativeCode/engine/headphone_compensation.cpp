@@ -46,6 +46,11 @@ void readFilter(const char* fileName, const std::string& bundleBasePath) {
 
 }  // namespace
 
+const char* headphoneFileName(int selection) noexcept {
+    const bool known = selection >= 1 && selection <= static_cast<int>(filters.size());
+    return known ? filters[static_cast<std::size_t>(selection - 1)].fileName : nullptr;
+}
+
 void loadHpTF(int FIR_size, int blocklenght, const std::string& bundleBasePath) {
     const int fftLength = 2 * blocklenght;
     if (FIR_size < filterLength) {

@@ -6,6 +6,9 @@
 
 namespace tessaly {
 
+/// File of a selection in the data directory, with a leading "/"; null if there is none.
+const char* headphoneFileName(int selection) noexcept;
+
 /// Makes a new process-wide `hpTFfilter` and fills it by `qvHpTFcompSelect`. Load time: reads a
 /// file, allocates; also called by the block in which engine 0 sees a new selection.
 /// A response shorter than 256 frames takes the small filter, moved to end with the block.

@@ -56,6 +56,7 @@ TEST_F(HeadphoneFilter, EverySelectionReadsItsFile) {
         LogCapture log;
         loadHpTF(4096, 1024, directory.path());
         EXPECT_EQ(essError, essErrorNone);
+        EXPECT_STREQ(headphoneFileName(row.selection), row.file);
         ASSERT_EQ(hpTFtimeLength, 2048);
         for (std::size_t i = 0; i < 2048; ++i) {
             ASSERT_EQ(hpTFfilter[i], i < 256 ? samples[i] : 0.0f) << i;
@@ -81,6 +82,7 @@ TEST_F(HeadphoneFilter, SelectionsOutsideTheTableLeaveAZeroFilter) {
         LogCapture log;
         loadHpTF(2048, 1024, "/nowhere");
         EXPECT_EQ(log.outputLines().back(), c.line);
+        EXPECT_EQ(headphoneFileName(c.selection), nullptr);
         EXPECT_EQ(essError, essErrorNone);
         for (int i = 0; i < 2048; ++i) {
             ASSERT_EQ(hpTFfilter[i], 0.0f);

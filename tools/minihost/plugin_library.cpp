@@ -4,6 +4,9 @@
 #include <dlfcn.h>
 
 #include <algorithm>
+#include <cerrno>
+#include <cstdlib>
+#include <cstring>
 #include <stdexcept>
 #include <system_error>
 
@@ -30,7 +33,46 @@ std::filesystem::path programFolder() {
     return std::filesystem::read_symlink("/proc/self/exe", ignored).parent_path();
 }
 
+// A new directory under the system's temporary one; goes with everything in it.
+class ScratchDirectory {
+public:
+    ScratchDirectory() {
+        std::string pattern = (std::filesystem::temp_directory_path() / "tessaly-XXXXXX").string();
+        if (mkdtemp(pattern.data()) == nullptr) {
+            throw std::runtime_error("cannot make a directory like " + pattern + ": " +
+                                     std::strerror(errno));
+        }
+        place = pattern;
+    }
+    ~ScratchDirectory() {
+        std::error_code ignored;
+        std::filesystem::remove_all(place, ignored);
+    }
+    ScratchDirectory(const ScratchDirectory&) = delete;
+    ScratchDirectory& operator=(const ScratchDirectory&) = delete;
+
+    const std::filesystem::path& path() const noexcept { return place; }
+
+private:
+    std::filesystem::path place;
+};
+
 }  // namespace
+
+PluginLibrary PluginLibrary::privateCopy(const std::filesystem::path& file) {
+    const ScratchDirectory scratch;
+    const std::filesystem::path copy = scratch.path() / file.filename();
+    std::error_code failure;
+    std::filesystem::copy_file(file, copy, failure);
+    if (failure) {
+        throw std::runtime_error("library " + file.string() +
+                                 " cannot be copied: " + failure.message());
+    }
+    // Loaded code keeps the removed file alive, so its identity is not given to the next copy.
+    PluginLibrary library(copy);
+    library.path = file;
+    return library;
+}
 
 std::filesystem::path PluginLibrary::locate(const std::string& given) {
     std::error_code ignored;

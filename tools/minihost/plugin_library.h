@@ -22,6 +22,11 @@ public:
     /// @throws std::runtime_error with one line that says what is missing
     explicit PluginLibrary(const std::filesystem::path& file);
 
+    /// Loads a copy of the file, which has process-wide state and definitions of its own. For
+    /// several independent sessions in one program; the copy on disk is gone when this returns.
+    /// @throws std::runtime_error as the constructor, or if the copy cannot be made
+    static PluginLibrary privateCopy(const std::filesystem::path& file);
+
     /// File name of the library on this platform.
     static constexpr const char* fileName = "libAudioPluginTessaly.so";
 

@@ -4,6 +4,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <cstdlib>
 #include <filesystem>
 #include <fstream>
 #include <stdexcept>
@@ -34,6 +35,46 @@ TEST(PluginLibrary, OpenedTwiceIsTheSameLibrary) {
     const PluginLibrary first(TESSALY_MOCK_PLUGIN);
     const PluginLibrary second(TESSALY_MOCK_PLUGIN);
     EXPECT_EQ(first.effects().data(), second.effects().data());
+}
+
+TEST(PluginLibrary, PrivateCopiesShareNothing) {
+    using Stored = float (*)(int);
+    const PluginLibrary shared(TESSALY_MOCK_PLUGIN);
+    const PluginLibrary first = PluginLibrary::privateCopy(TESSALY_MOCK_PLUGIN);
+    const PluginLibrary second = PluginLibrary::privateCopy(TESSALY_MOCK_PLUGIN);
+    EXPECT_NE(first.effects().data(), second.effects().data());
+    EXPECT_EQ(first.file(), TESSALY_MOCK_PLUGIN);
+    shared.setRoomDistances({1.0f, 1.0f, 1.0f, 1.0f, 1.0f, 1.0f});
+    first.setRoomDistances({2.0f, 2.0f, 2.0f, 2.0f, 2.0f, 2.0f});
+    second.setRoomDistances({3.0f, 3.0f, 3.0f, 3.0f, 3.0f, 3.0f});
+    float expected = 1.0f;
+    for (const PluginLibrary* library : {&shared, &first, &second}) {
+        const auto stored = reinterpret_cast<Stored>(library->findSymbol("MockRoomDistance"));
+        ASSERT_NE(stored, nullptr);
+        EXPECT_EQ(stored(0), expected);
+        expected += 1.0f;
+    }
+}
+
+TEST(PluginLibrary, PrivateCopyLeavesNothingBehind) {
+    const std::filesystem::path folder =
+        std::filesystem::path(::testing::TempDir()) / "private_copy_test";
+    std::filesystem::remove_all(folder);
+    std::filesystem::create_directories(folder);
+    const char* before = std::getenv("TMPDIR");
+    const std::string kept = before != nullptr ? before : "";
+    setenv("TMPDIR", folder.c_str(), 1);
+    const PluginLibrary library = PluginLibrary::privateCopy(TESSALY_MOCK_PLUGIN);
+    EXPECT_THAT(failureOf([] { PluginLibrary::privateCopy("/no/such/library.so"); }),
+                HasSubstr("/no/such/library.so cannot be copied"));
+    EXPECT_TRUE(std::filesystem::is_empty(folder));
+    if (before != nullptr) {
+        setenv("TMPDIR", kept.c_str(), 1);
+    } else {
+        unsetenv("TMPDIR");
+    }
+    EXPECT_EQ(library.testMethode(7), 1);
+    std::filesystem::remove_all(folder);
 }
 
 TEST(PluginLibrary, ParametersHaveTheirIndices) {
