@@ -19,7 +19,6 @@ constexpr double fitTo = -25.0;          // dB
 constexpr double densityWindow = 20e-3;  // s
 constexpr double gaussianShare = 0.3173;
 constexpr std::size_t lastFrames = 60;
-constexpr double lowestInOctave = 0.59460355750136051;  // 2^-0.75: where an octave's skirt ends
 
 /// Sums of auto and cross spectra in octaves.
 class CoherenceSums {
@@ -54,44 +53,6 @@ private:
     std::array<double, coherenceBands> left_{};
     std::array<double, coherenceBands> right_{};
 };
-
-/// Line through a decay curve in dB, equally spaced from its begin on.
-/// @return seconds for 60 dB, 0 if the curve does not reach the end of the range
-double fittedTime(const std::vector<double>& energy, double spacingSeconds) {
-    double n = 0.0;
-    double sumX = 0.0;
-    double sumY = 0.0;
-    double sumXX = 0.0;
-    double sumXY = 0.0;
-    bool reached = false;
-    for (std::size_t i = 0; i < energy.size() && !reached; ++i) {
-        const double level = 10.0 * std::log10(energy[i] / energy[0]);
-        reached = !(level >= fitTo);
-        if (!reached && level <= fitFrom) {
-            const double x = static_cast<double>(i) * spacingSeconds;
-            n += 1.0;
-            sumX += x;
-            sumY += level;
-            sumXX += x * x;
-            sumXY += x * level;
-        }
-    }
-    const double slope = (n * sumXY - sumX * sumY) / (n * sumXX - sumX * sumX);
-    return reached && n > 2.0 && slope < 0.0 ? -60.0 / slope : 0.0;
-}
-
-/// Flat to a quarter octave either side, 3 dB down at half an octave, zero at three quarters.
-double octaveWeight(double octaves) noexcept {
-    const double place = (std::abs(octaves) - 0.25) / 0.5;
-    if (place <= 0.0) {
-        return 1.0;
-    }
-    return place < 1.0 ? std::cos(0.5 * std::numbers::pi * place) : 0.0;
-}
-
-double octaveCentre(std::size_t octave) noexcept {
-    return lowestDecayHertz * std::exp2(static_cast<double>(octave));
-}
 
 std::size_t frameAt(double seconds, int sampleRate) noexcept {
     return static_cast<std::size_t>(std::lround(seconds * sampleRate));
@@ -153,47 +114,25 @@ OctaveTimes measuredTimes(const std::vector<float>& tail,
                           int sampleRate,
                           const TailDesign& design) {
     const std::size_t frames = tail.size() / earCount;
-    RealTransform& transform = threadTransform(nextPowerOfTwo(frames + 4096));
-    const double binHertz = sampleRate / static_cast<double>(transform.length());
     const std::size_t onset = frameAt(design.onsetSeconds, sampleRate);
     const std::size_t step = curveStep(frames);
-    std::vector<double> time(transform.length());
-    std::vector<Complex> spectrum(transform.bins());
-    std::vector<Complex> part(transform.bins());
+    std::vector<double> response(frames);
     std::array<std::vector<double>, decayOctaves> energies;
     for (std::size_t ear = 0; ear < earCount; ++ear) {
-        std::fill(time.begin(), time.end(), 0.0);
         for (std::size_t i = 0; i < frames; ++i) {
-            time[i] = wide(tail[earCount * i + ear]);
+            response[i] = wide(tail[earCount * i + ear]);
         }
-        transform.forward(time.data(), spectrum.data());
-        for (std::size_t octave = 0; octave < decayOctaves; ++octave) {
-            const double centre = octaveCentre(octave);
-            std::fill(part.begin(), part.end(), Complex());
-            const auto first = static_cast<std::size_t>(centre * lowestInOctave / binHertz) + 1;
-            const auto last = static_cast<std::size_t>(centre / lowestInOctave / binHertz);
-            for (std::size_t k = first; k <= std::min(last, part.size() - 1); ++k) {
-                const double hertz = static_cast<double>(k) * binHertz;
-                part[k] = spectrum[k] * octaveWeight(std::log2(hertz / centre));
-            }
-            transform.inverse(part.data(), time.data());
-            energies[octave].resize(frames);
-            for (std::size_t i = 0; i < frames; ++i) {
-                energies[octave][i] += time[i] * time[i];
-            }
-        }
+        addOctaveEnergies(response, sampleRate, energies);
     }
     OctaveTimes times{};
     for (std::size_t octave = 0; octave < decayOctaves; ++octave) {
         std::vector<double>& energy = energies[octave];
-        for (std::size_t i = frames - 1; i > onset; --i) {
-            energy[i - 1] += energy[i];
-        }
+        integrateBackwards(energy, onset);
         std::vector<double> curve;
         for (std::size_t i = onset; i < frames; i += step) {
             curve.push_back(energy[i]);
         }
-        times[octave] = fittedTime(curve, static_cast<double>(step) / sampleRate);
+        times[octave] = fittedTime(curve, static_cast<double>(step) / sampleRate, fitFrom, fitTo);
     }
     return times;
 }
@@ -222,7 +161,7 @@ OctaveTimes designedTimes(std::size_t frames, int sampleRate, const TailDesign& 
                 curve[i] += weight * weight * (std::exp(-decay * seconds) - cutOff) / decay;
             }
         }
-        times[octave] = fittedTime(curve, static_cast<double>(step) / sampleRate);
+        times[octave] = fittedTime(curve, static_cast<double>(step) / sampleRate, fitFrom, fitTo);
     }
     return times;
 }

@@ -5,12 +5,10 @@
 #include <vector>
 
 #include "data/hrir_set.h"
+#include "data/octave_decay.h"
 #include "data/tail_design.h"
 
 namespace tessaly::data {
-
-inline constexpr std::size_t decayOctaves = 7;  ///< 125 to 8000 Hz
-inline constexpr double lowestDecayHertz = 125.0;
 
 /// Octaves from 100 Hz up to 12.8 kHz, of which those below half the rate count.
 inline constexpr std::size_t coherenceBands = 7;

@@ -11,6 +11,7 @@
 #include <optional>
 #include <span>
 
+#include "render/chart_axis.h"
 #include "render/svg_canvas.h"
 
 namespace tessaly {
@@ -36,30 +37,6 @@ constexpr std::string_view frameColour = "#9a9a9a";
 constexpr std::string_view quietColour = "#666666";
 
 constexpr int pathSteps = 240;
-
-struct Range {
-    double low = 0.0;
-    double high = 1.0;
-
-    double place(double value, double from, double to) const {
-        return from + (to - from) * (value - low) / (high - low);
-    }
-};
-
-// Label of a tick: as many decimals as the step needs.
-std::string tickLabel(double value, double step) {
-    const int decimals = std::max(0, static_cast<int>(-std::floor(std::log10(step) + 1e-9)));
-    const double shown = std::abs(value) < 1e-9 * step ? 0.0 : value;
-    return fmt::format("{:.{}f}", shown, decimals);
-}
-
-void forEachTick(const Range& range, double step, const std::function<void(double)>& draw) {
-    const double first = std::ceil(range.low / step - 1e-9);
-    const double last = std::floor(range.high / step + 1e-9);
-    for (double index = first; index <= last; index += 1.0) {
-        draw(index * step);
-    }
-}
 
 // Colour of the path at a moment: from orange at the start to violet at the end.
 std::string pathColour(double fraction) {
@@ -256,8 +233,8 @@ struct Curve {
 // Points without a value, or below the chart, break the curve; a lone point becomes a dot.
 void drawCurve(SvgCanvas& canvas,
                const Box& box,
-               const Range& times,
-               const Range& values,
+               const AxisRange& times,
+               const AxisRange& values,
                const Curve& curve,
                const std::vector<BinauralPoint>& points) {
     std::vector<Point> run;
@@ -299,10 +276,10 @@ void drawChart(SvgCanvas& canvas,
                std::string_view title,
                std::string_view unit,
                double duration,
-               const Range& values,
+               const AxisRange& values,
                const std::vector<Curve>& curves,
                const std::vector<BinauralPoint>& points) {
-    const Range times{0.0, duration};
+    const AxisRange times{0.0, duration};
     const double timeStep = niceStep(0.0, duration, 8);
     const double valueStep = niceStep(values.low, values.high, 5);
     canvas.text({box.x, box.y - 10.0}, title, {.size = 14.0, .bold = true});
@@ -330,7 +307,7 @@ void drawChart(SvgCanvas& canvas,
     canvas.endClip();
 }
 
-Range levelRange(const std::vector<BinauralPoint>& points) {
+AxisRange levelRange(const std::vector<BinauralPoint>& points) {
     double loudest = silenceDb;
     for (const BinauralPoint& point : points) {
         loudest = std::max({loudest, point.leftDb, point.rightDb});
@@ -339,7 +316,7 @@ Range levelRange(const std::vector<BinauralPoint>& points) {
     return {top - 60.0, top};
 }
 
-Range differenceRange(const std::vector<BinauralPoint>& points) {
+AxisRange differenceRange(const std::vector<BinauralPoint>& points) {
     double largest = 0.0;
     for (const BinauralPoint& point : points) {
         largest = std::max(largest, std::abs(point.levelDifference.value_or(0.0)));
@@ -388,17 +365,6 @@ std::string drawPicture(const PictureContent& content) {
     drawViews(canvas, content);
     drawCharts(canvas, content);
     return canvas.document();
-}
-
-double niceStep(double low, double high, int wanted) noexcept {
-    const double rough = (high - low) / wanted;
-    const double decade = std::pow(10.0, std::floor(std::log10(rough)));
-    for (const double factor : {1.0, 2.0, 5.0}) {
-        if (factor * decade >= rough * 0.999) {
-            return factor * decade;
-        }
-    }
-    return 10.0 * decade;
 }
 
 double sphereTimeDifference(const Spherical& direction) noexcept {

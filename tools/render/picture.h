@@ -21,11 +21,6 @@ struct PictureContent {
 /// @returns an SVG document
 std::string drawPicture(const PictureContent& content);
 
-/// Ticks at multiples of 1, 2 or 5 times a power of ten.
-/// @param wanted  about how many steps; 1 or more
-/// @returns the step, above 0 for high above low
-double niceStep(double low, double high, int wanted) noexcept;
-
 /// Time difference of a rigid sphere with the ears at its sides, positive toward the right.
 /// @returns milliseconds
 double sphereTimeDifference(const Spherical& direction) noexcept;

@@ -68,8 +68,11 @@ std::size_t sequenceLength(std::string_view text) {
 
 }  // namespace
 
-SvgCanvas::SvgCanvas(double width, double height) : canvasWidth(width), canvasHeight(height) {
-    rectangle({0.0, 0.0, width, height}, "#ffffff", {.width = 0.0});
+SvgCanvas::SvgCanvas(double width, double height, std::string_view background)
+    : canvasWidth(width), canvasHeight(height) {
+    if (!background.empty()) {
+        rectangle({0.0, 0.0, width, height}, background, {.width = 0.0});
+    }
 }
 
 void SvgCanvas::text(Point place, std::string_view words, const TextStyle& style) {
@@ -140,6 +143,11 @@ std::string SvgCanvas::document() const {
         "viewBox=\"0 0 {0} {1}\" font-family=\"Helvetica, Arial, 'DejaVu Sans', sans-serif\">\n"
         "{2}</svg>\n",
         number(canvasWidth), number(canvasHeight), body);
+}
+
+std::string SvgCanvas::pageElement(std::string_view attributes) const {
+    return fmt::format("<svg viewBox=\"0 0 {} {}\" {}>\n{}</svg>\n", number(canvasWidth),
+                       number(canvasHeight), attributes, body);
 }
 
 std::string escapedXml(std::string_view text) {

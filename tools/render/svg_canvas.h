@@ -42,7 +42,8 @@ struct LineStyle {
 /// Shapes are drawn in the order of the calls. Coordinates keep two decimals.
 class SvgCanvas {
 public:
-    SvgCanvas(double width, double height);
+    /// @param background  colour behind everything; empty for none
+    SvgCanvas(double width, double height, std::string_view background = "#ffffff");
 
     void text(Point place, std::string_view words, const TextStyle& style = {});
     void line(Point from, Point to, const LineStyle& style = {});
@@ -59,6 +60,11 @@ public:
 
     /// @returns the whole document
     std::string document() const;
+
+    /// The shapes as an element of an HTML page. Clips are numbered in each canvas anew, so a page
+    /// can hold one canvas with clips at most.
+    /// @param attributes  further ones of the svg element, as they are written
+    std::string pageElement(std::string_view attributes) const;
 
 private:
     std::string body;

@@ -6,6 +6,7 @@
 
 #include <cmath>
 
+#include "render/chart_axis.h"
 #include "tools/render/xml_check.h"
 
 namespace tessaly {

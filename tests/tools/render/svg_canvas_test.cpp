@@ -23,6 +23,19 @@ TEST(XmlCheck, FindsTheFaultsItLooksFor) {
     }
 }
 
+TEST(SvgCanvas, PageElementHasTheShapesAloneWithoutABackground) {
+    SvgCanvas canvas(100.0, 50.0, "");
+    canvas.line({0.0, 1.0}, {2.0, 3.0}, {.colour = "var(--left)"});
+    const std::string element = canvas.pageElement("aria-hidden=\"true\"");
+    EXPECT_EQ(xmlFault(element), "");
+    EXPECT_THAT(element,
+                ::testing::StartsWith("<svg viewBox=\"0 0 100 50\" aria-hidden=\"true\">"));
+    EXPECT_EQ(countElements(element, "line"), 1);
+    EXPECT_EQ(countElements(element, "rect"), 0);
+    EXPECT_THAT(element, HasSubstr("stroke=\"var(--left)\""));
+    EXPECT_THAT(element, Not(HasSubstr("http")));
+}
+
 TEST(SvgCanvas, EveryShapeIsWellFormed) {
     SvgCanvas canvas(100.0, 50.0);
     const std::array<Point, 3> points = {{{1.0, 2.0}, {3.0, 4.0}, {5.0, 6.0}}};
