@@ -1,0 +1,1 @@
+// Gives the precompiled headers of all tests a target to be made for.
