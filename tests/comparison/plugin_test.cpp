@@ -5,144 +5,46 @@
 #include <array>
 #include <cmath>
 #include <cstdio>
-#include <map>
 #include <memory>
 #include <random>
-#include <span>
 #include <sstream>
 #include <string>
 #include <utility>
 #include <vector>
 
 #include "comparison/deviation.h"
-#include "minihost/effect_instance.h"
-#include "minihost/plugin_library.h"
-#include "minihost/pose.h"
-#include "support/reference/reference_spatializer.h"
+#include "comparison/hosted_source.h"
 #include "support/test_data.h"
 
 namespace tessaly::test {
 namespace {
 
-// Parameter indices of the spatializer.
-constexpr int gain = 0;
-constexpr int direct = 1;
-constexpr int angle = 4;
-constexpr int distanceFactor = 5;
-constexpr int unityDistance = 6;
-constexpr int auralization = 7;
-constexpr int roomSelection = 8;
-constexpr int occlusion = 9;
-constexpr int reverbDisable = 10;
-constexpr int inputChannel = 11;
-constexpr int roomSize = 14;
-constexpr int bassBoost = 15;
-constexpr int bypass = 16;
+using namespace parameter;
 
-/// The loaded library and the reference's process. The library keeps its process-wide values until
-/// the program ends, so the reference's process lives as long.
-struct World {
-    World() {
-        for (const int rate : {24000, 44100, 48000}) {
-            writePackedHrirSet(directory.path(), rate);
-        }
-        pathTaken = library.setStreamingAssetsPath(directory.path());
-        process.hrirSource = [this](int sampleRate, int frames) {
-            const auto [at, fresh] = files.try_emplace({sampleRate, frames});
-            if (fresh) {
-                at->second = reference::packedFilesIn(directory.path())(sampleRate, frames);
-            }
-            return at->second;
-        };
+/// Small sets at all rates.
+const std::string& smallSets() {
+    static const TempDirectory directory;
+    for (const int rate : {24000, 44100, 48000}) {
+        writePackedHrirSet(directory.path(), rate);
     }
-
-    TempDirectory directory;
-    PluginLibrary library{TESSALY_PLUGIN};
-    reference::Process process;
-    std::map<std::pair<int, int>, reference::HrirFile> files;
-    bool pathTaken = false;
-};
-
-World& world() {
-    static World theWorld;
-    return theWorld;
+    return directory.path();
 }
 
-/// One source in the game: the effect with its records, and the reference's.
-class HostedSource {
+Game& game() {
+    static Game theGame(smallSets());
+    return theGame;
+}
+
+class PlayedSource : public HostedSource {
 public:
-    HostedSource(int sampleRate, int blockLength)
-        : effect_(world().library.effect("Tessaly Engine"),
-                  static_cast<std::uint32_t>(sampleRate),
-                  static_cast<std::uint32_t>(blockLength)),
-          reference_(world().process) {}
-
-    void set(int index, float value) {
-        EXPECT_EQ(effect_.setParameter(index, value), 0);
-        EXPECT_TRUE(reference_.setParameter(index, value));
-    }
-
-    /// What the host says of the mixer from the next block on.
-    void setFormat(int sampleRate, int blockLength) {
-        effect_.state().samplerate = static_cast<std::uint32_t>(sampleRate);
-        effect_.state().dspbuffersize = static_cast<std::uint32_t>(blockLength);
-    }
-
-    /// One block of noise with both poses as they stand.
-    /// @param frames  0 for the mixer's block length
-    ::testing::AssertionResult play(Deviation& deviation, int inChannels = 2, int frames = 0) {
-        UnityAudioEffectState& state = effect_.state();
-        if (frames == 0) {
-            frames = static_cast<int>(state.dspbuffersize);
-        }
-        effect_.place(listener, source);
-        UnityAudioSpatializerData& data = effect_.spatializerData();
-        data.reverbzonemix = 0.8f;
-        float ignored = attenuation;
-        data.distanceattenuationcallback(&state, effect_.distance(), attenuation, &ignored);
-        reference_.setDistance(effect_.distance(), attenuation, data.reverbzonemix);
-
-        std::uniform_real_distribution<float> sample(-0.25f, 0.25f);
-        in_.resize(static_cast<std::size_t>(frames * inChannels));
-        std::generate(in_.begin(), in_.end(), [&] { return sample(noise_); });
-        out_.assign(static_cast<std::size_t>(2 * frames), 7.0f);
-        const int result = effect_.definition().process(
-            &state, in_.data(), out_.data(), static_cast<std::uint32_t>(frames), inChannels, 2);
-        reference_.process(std::span<const float, 16>(data.listenermatrix),
-                           std::span<const float, 16>(data.sourcematrix), in_, frames, inChannels,
-                           static_cast<int>(state.samplerate),
-                           static_cast<int>(state.dspbuffersize), expected_);
-        const std::string difference = deviation.compare(out_, expected_);
-        ++block_;
-        if (result == 0 && difference.empty()) {
-            return ::testing::AssertionSuccess();
-        }
-        return ::testing::AssertionFailure()
-               << "result " << result << ", block " << block_ - 1 << " of " << frames
-               << " frames at " << state.samplerate << " Hz: " << difference;
-    }
-
-    reference::Handler& handler() { return reference_.handler; }
-
-    Pose listener;
-    Pose source{{0.0, 0.0, 1.0}};
-    float attenuation = 1.0f;
-
-private:
-    EffectInstance effect_;
-    reference::Spatializer reference_;
-    std::mt19937 noise_{5};
-    std::vector<float> in_;
-    std::vector<float> out_;
-    std::vector<double> expected_;
-    int block_ = 0;
+    PlayedSource(int sampleRate, int blockLength) : HostedSource(game(), sampleRate, blockLength) {}
 };
 
 class PluginComparison : public ::testing::Test {
 protected:
     void SetUp() override {
-        ASSERT_TRUE(world().pathTaken);
-        ASSERT_EQ(world().library.getErrorState(), 1);
+        ASSERT_TRUE(game().pathTaken);
+        ASSERT_EQ(game().library.getErrorState(), 1);
     }
     void TearDown() override {
         std::ostringstream largest;
@@ -152,27 +54,16 @@ protected:
                     deviation.largest(), deviation.samples(), deviation.peak());
         EXPECT_LE(deviation.largest(), tolerance);
         EXPECT_GT(deviation.peak(), 0.05) << "silence was compared with silence";
-        EXPECT_EQ(world().library.getErrorState(), 1);
+        EXPECT_EQ(game().library.getErrorState(), 1);
     }
 
     Deviation deviation;
 };
 
-/// Both of them walk and turn.
-void walk(HostedSource& one, int block) {
-    const double t = 0.13 * block;
-    one.listener.position = {0.4 * std::sin(t), 0.3 * std::cos(0.7 * t), 0.2 * t};
-    one.listener.yaw = 40.0 * std::sin(0.3 * t);
-    one.listener.pitch = 20.0 * std::sin(0.8 * t);
-    one.listener.roll = 25.0 * std::sin(0.5 * t);
-    one.source.position = {3.0 * std::cos(t), 1.5 * std::sin(1.7 * t), 3.0 * std::sin(t) + 0.2 * t};
-    one.source.yaw = 90.0 * t;  // not heard
-}
-
 TEST_F(PluginComparison, WalkingSourceAtAllRatesAndBlockSizes) {
     for (const int rate : {24000, 44100, 48000}) {
         for (const int blockLength : {32, 64, 128, 256, 512, 1024, 2048, 4096}) {
-            HostedSource one(rate, blockLength);
+            PlayedSource one(rate, blockLength);
             one.set(roomSelection, 0.0f);
             for (int block = 0; block < 16; ++block) {
                 walk(one, block);
@@ -183,7 +74,7 @@ TEST_F(PluginComparison, WalkingSourceAtAllRatesAndBlockSizes) {
 }
 
 TEST_F(PluginComparison, SilenceUntilARoomIsSelected) {
-    HostedSource one(48000, 256);
+    PlayedSource one(48000, 256);
     ASSERT_TRUE(one.play(deviation));
     EXPECT_EQ(deviation.peak(), 0.0);
     one.set(roomSelection, 3.0f);
@@ -193,7 +84,7 @@ TEST_F(PluginComparison, SilenceUntilARoomIsSelected) {
 }
 
 TEST_F(PluginComparison, AngleAndDistanceFactors) {
-    HostedSource one(44100, 128);
+    PlayedSource one(44100, 128);
     one.set(roomSelection, 0.0f);
     int block = 0;
     for (const float exponent : {1.0f, 1.005f, 0.5f, 2.0f, 0.1f, 10.0f}) {
@@ -207,7 +98,7 @@ TEST_F(PluginComparison, AngleAndDistanceFactors) {
 }
 
 TEST_F(PluginComparison, SourcesOverheadBesideAndInsideTheHead) {
-    HostedSource one(48000, 256);
+    PlayedSource one(48000, 256);
     one.set(roomSelection, 0.0f);
     constexpr std::array<Vector3, 13> places = {{
         {0.0, 0.0, 0.0},
@@ -235,7 +126,7 @@ TEST_F(PluginComparison, SourcesOverheadBesideAndInsideTheHead) {
 TEST_F(PluginComparison, OcclusionSwingsOverItsTime) {
     for (const int rate : {24000, 48000}) {
         for (const int blockLength : {256, 1024}) {
-            HostedSource one(rate, blockLength);
+            PlayedSource one(rate, blockLength);
             one.set(roomSelection, 0.0f);
             const int full = static_cast<int>(0.7 * rate / blockLength);
             for (const float target : {0.0f, 1.0f, 0.35f, 0.36f, 0.0f}) {
@@ -249,7 +140,7 @@ TEST_F(PluginComparison, OcclusionSwingsOverItsTime) {
 }
 
 TEST_F(PluginComparison, LevelsChannelsAndSwitches) {
-    HostedSource one(48000, 256);
+    PlayedSource one(48000, 256);
     one.set(roomSelection, 0.0f);
     constexpr std::array<std::pair<int, float>, 22> changes = {{
         {gain, -6.0f},         {direct, 3.0f},        {inputChannel, -1.0f}, {inputChannel, 1.0f},
@@ -271,8 +162,8 @@ TEST_F(PluginComparison, LevelsChannelsAndSwitches) {
 }
 
 TEST_F(PluginComparison, ReloadsForRateBlockRoomAndReverb) {
-    HostedSource one(48000, 256);
-    HostedSource other(48000, 256);
+    PlayedSource one(48000, 256);
+    PlayedSource other(48000, 256);
     one.set(roomSelection, 0.0f);
     other.set(roomSelection, 15.0f);
     int block = 0;
@@ -300,11 +191,11 @@ TEST_F(PluginComparison, ReloadsForRateBlockRoomAndReverb) {
 }
 
 TEST_F(PluginComparison, BypassOf3DTakesPanPairsAndBack) {
-    HostedSource one(44100, 512);
+    PlayedSource one(44100, 512);
     one.set(roomSelection, 0.0f);
     for (const bool pan : {false, true, false}) {
-        world().library.set3DBypass(pan);
-        world().process.bypass3DAudio = pan;
+        game().library.set3DBypass(pan);
+        game().process.bypass3DAudio = pan;
         for (int block = 0; block < 12; ++block) {
             walk(one, block);
             ASSERT_TRUE(one.play(deviation)) << pan;
@@ -313,7 +204,7 @@ TEST_F(PluginComparison, BypassOf3DTakesPanPairsAndBack) {
 }
 
 TEST_F(PluginComparison, ShortBlocksKeepTheRestOfTheInputBlock) {
-    HostedSource one(48000, 256);
+    PlayedSource one(48000, 256);
     one.set(roomSelection, 0.0f);
     for (int block = 0; block < 24; ++block) {
         walk(one, block);
@@ -341,7 +232,7 @@ TEST_P(RandomGame, SourcesWithChangingParameters) {
     std::vector<std::unique_ptr<HostedSource>> sources;
     for (int turn = 0; turn < 60; ++turn) {
         if (sources.empty() || (sources.size() < 4 && between(1, 12) == 1)) {
-            sources.push_back(std::make_unique<HostedSource>(rate, blockLength));
+            sources.push_back(std::make_unique<PlayedSource>(rate, blockLength));
             sources.back()->set(roomSelection, 0.0f);
         } else if (sources.size() > 1 && between(1, 20) == 1) {
             sources.erase(sources.begin() + between(0, static_cast<int>(sources.size()) - 1));

@@ -100,6 +100,43 @@ TEST(ReferenceConvolver, TransformedSumsEqualDirectSumsForLargeBlocks) {
     }
 }
 
+TEST(ReferenceConvolver, CuttingAgainEqualsCuttingAfresh) {
+    const int b = 16;
+    const int n = 4;
+    std::vector<double> left = noise(n * b, 20);
+    std::vector<double> right = noise(n * b, 21);
+    PartitionedResponse again(b, n);
+    again.cut(left, right);
+    left[b + 3] = 0.5;       // the second partition
+    right[4 * b - 1] = 0.0;  // and the last
+    again.cut(left, right);
+    PartitionedResponse fresh(b, n);
+    fresh.cut(left, right);
+    for (int p = 0; p < n; ++p) {
+        ASSERT_EQ(again.taps(p), fresh.taps(p)) << p;
+        ASSERT_EQ(again.spectrum(p), fresh.spectrum(p)) << p;
+    }
+    const std::vector<double> silence(static_cast<std::size_t>(n * b), 0.0);
+    again.cut(silence, silence);
+    for (int p = 0; p < n; ++p) {
+        ASSERT_EQ(again.spectrum(p), Pairs(static_cast<std::size_t>(2 * b))) << p;
+    }
+}
+
+TEST(ReferenceConvolver, SlotsAreSilentUntilWritten) {
+    WindowRing ring(4, 2);
+    EXPECT_TRUE(ring.silent(0));
+    ring.write(0, noise(8, 22));
+    EXPECT_FALSE(ring.silent(0));
+    EXPECT_TRUE(ring.silent(1));
+    ring.write(0, std::vector<double>(8, 0.0));
+    EXPECT_TRUE(ring.silent(0));
+    std::vector<double> last(8, 0.0);
+    last[7] = -1e-300;
+    ring.write(1, last);
+    EXPECT_FALSE(ring.silent(1));
+}
+
 TEST(ReferenceConvolver, DirectFeedActsCircularlyOverTwoBlocks) {
     const int b = 8;
     std::vector<double> taps(static_cast<std::size_t>(2 * b), 0.0);

@@ -41,6 +41,22 @@ TEST(ReferenceRooms, TailsHaveTheirLengthAndGain) {
     EXPECT_TRUE(tailOf(0, 48000, test::testTailSample).pairs.empty());
 }
 
+TEST(ReferenceRooms, TailsOfAFileStandWhereItsIndexSays) {
+    const test::TempDirectory directory;
+    for (const int rate : {24000, 44100, 48000}) {
+        test::writePackedTails(directory.path(), rate, {53, 20});
+        for (const int preset : {20, 53}) {
+            const Tail read = packedTailOf(directory.path(), preset, rate);
+            const Tail made = tailOf(preset, rate, test::testTailSample);
+            EXPECT_EQ(read.pairs, made.pairs) << preset;
+            EXPECT_EQ(read.presetGain, made.presetGain);
+        }
+    }
+    // Behind the file's end.
+    const Tail missing = packedTailOf(directory.path(), 41, 48000);
+    EXPECT_EQ(missing.pairs, std::vector<float>(2 * 12784, 0.0f));
+}
+
 TEST(ReferenceRooms, SourceAheadIsReflectedFromAllSides) {
     const WallScene scene = ordinaryRoom();
     // Path beyond the direct one, and the whole path; the front wall's is told without the direct.

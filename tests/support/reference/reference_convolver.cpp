@@ -5,6 +5,7 @@
 #include <cmath>
 #include <map>
 #include <numbers>
+#include <utility>
 
 namespace tessaly::reference {
 
@@ -15,13 +16,13 @@ std::complex<double> product(std::complex<double> a, std::complex<double> b) {
     return {a.real() * b.real() - a.imag() * b.imag(), a.real() * b.imag() + a.imag() * b.real()};
 }
 
-/// e^(-2 pi i k / n) for k below n / 2, worked out once a length.
-const Pairs& turnsOf(std::size_t n) {
-    static std::map<std::size_t, Pairs> tables;
-    Pairs& turns = tables[n];
+/// e^(-2 pi i k / n), or its conjugate, for k below n / 2, worked out once a length.
+const Pairs& turnsOf(std::size_t n, bool conjugate) {
+    static std::map<std::pair<std::size_t, bool>, Pairs> tables;
+    Pairs& turns = tables[{n, conjugate}];
     for (std::size_t k = turns.size(); k < n / 2; ++k) {
-        const double angle =
-            -2.0 * std::numbers::pi * static_cast<double>(k) / static_cast<double>(n);
+        const double angle = (conjugate ? 2.0 : -2.0) * std::numbers::pi * static_cast<double>(k) /
+                             static_cast<double>(n);
         turns.push_back({std::cos(angle), std::sin(angle)});
     }
     return turns;
@@ -41,17 +42,15 @@ void fourier(std::vector<std::complex<double>>& values, bool backward) {
             std::swap(values[i], values[j]);
         }
     }
-    const Pairs& turns = turnsOf(n);
     for (std::size_t length = 2; length <= n; length *= 2) {
-        const std::size_t step = n / length;
+        const std::size_t half = length / 2;
+        const Pairs& turns = turnsOf(length, backward);
         for (std::size_t start = 0; start < n; start += length) {
-            for (std::size_t k = 0; k < length / 2; ++k) {
-                const std::complex<double> turn =
-                    backward ? std::conj(turns[k * step]) : turns[k * step];
-                const std::complex<double> odd = product(values[start + k + length / 2], turn);
+            for (std::size_t k = 0; k < half; ++k) {
+                const std::complex<double> odd = product(values[start + k + half], turns[k]);
                 const std::complex<double> even = values[start + k];
                 values[start + k] = even + odd;
-                values[start + k + length / 2] = even - odd;
+                values[start + k + half] = even - odd;
             }
         }
     }
@@ -61,9 +60,11 @@ WindowRing::WindowRing(int blockLength, int slotCount)
     : windows_(static_cast<std::size_t>(slotCount),
                std::vector<double>(static_cast<std::size_t>(2 * blockLength), 0.0)),
       spectra_(static_cast<std::size_t>(slotCount),
-               Pairs(static_cast<std::size_t>(2 * blockLength))) {}
+               Pairs(static_cast<std::size_t>(2 * blockLength))),
+      silent_(static_cast<std::size_t>(slotCount), true) {}
 
 void WindowRing::write(int slot, std::span<const double> window) {
+    silent_[slot] = std::all_of(window.begin(), window.end(), [](double x) { return x == 0.0; });
     windows_[slot].assign(window.begin(), window.end());
     spectra_[slot].assign(window.begin(), window.end());
     fourier(spectra_[slot], false);
@@ -81,12 +82,21 @@ void PartitionedResponse::take(int partition,
                                int first,
                                int count) {
     Pairs& taps = taps_[partition];
-    std::fill(taps.begin(), taps.end(), std::complex<double>{});
-    for (int i = 0; i < count; ++i) {
-        taps[i] = {left.at(first + i), right.at(first + i)};
+    bool changed = false;
+    for (int i = 0; i < static_cast<int>(taps.size()); ++i) {
+        std::complex<double> tap;
+        if (i < count) {
+            tap = {left.at(first + i), right.at(first + i)};
+        }
+        if (taps[i] != tap) {
+            taps[i] = tap;
+            changed = true;
+        }
     }
-    spectra_[partition] = taps;
-    fourier(spectra_[partition], false);
+    if (changed) {
+        spectra_[partition] = taps;
+        fourier(spectra_[partition], false);
+    }
 }
 
 void PartitionedResponse::cut(const std::vector<double>& left, const std::vector<double>& right) {
@@ -121,7 +131,11 @@ Pairs convolveBlock(const WindowRing& ring,
     }
     Pairs sum(static_cast<std::size_t>(2 * b));
     for (int p = 0; p < n; ++p) {
-        const Pairs& x = ring.spectrum((newestSlot - p + n) % n);
+        const int slot = (newestSlot - p + n) % n;
+        if (ring.silent(slot)) {
+            continue;
+        }
+        const Pairs& x = ring.spectrum(slot);
         const Pairs& h = response.spectrum(p);
         for (int k = 0; k < 2 * b; ++k) {
             sum[k] += product(x[k], h[k]);

@@ -25,14 +25,18 @@ public:
     void write(int slot, std::span<const double> window);
     const std::vector<double>& window(int slot) const { return windows_[slot]; }
     const Pairs& spectrum(int slot) const { return spectra_[slot]; }
+    /// Nothing but zeros: adds nothing to any sum.
+    bool silent(int slot) const { return silent_[slot]; }
     int slotCount() const { return static_cast<int>(windows_.size()); }
 
 private:
     std::vector<std::vector<double>> windows_;
     std::vector<Pairs> spectra_;
+    std::vector<bool> silent_;
 };
 
-/// A pair of responses cut into N partitions, each a sequence of 2 * blockLength taps.
+/// A pair of responses cut into N partitions, each a sequence of 2 * blockLength taps. A partition
+/// that is given the taps it has keeps its spectrum: of a long tail little changes.
 class PartitionedResponse {
 public:
     PartitionedResponse(int blockLength, int partitionCount);

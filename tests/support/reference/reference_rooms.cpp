@@ -3,7 +3,10 @@
 
 #include <algorithm>
 #include <cmath>
+#include <cstdint>
 #include <cstdlib>
+#include <fstream>
+#include <ios>
 
 #include "base/numeric_conversion.h"
 #include "base/precision.h"
@@ -111,6 +114,23 @@ Tail tailOf(int preset, int sampleRate, const std::function<float(int, int, int)
         }
     }
     return tail;
+}
+
+Tail packedTailOf(const std::string& directory, int preset, int sampleRate) {
+    constexpr std::streamoff indexAt = 2;
+    constexpr std::streamoff samplesAt = 242;
+    const char* digit = sampleRate == 44100 ? "0" : sampleRate == 48000 ? "1" : "2";
+    std::ifstream file(directory + "/TSLdata51" + digit + ".dat", std::ios::binary);
+    std::int32_t start = 0;
+    file.seekg(indexAt + 4 * (preset - 1));
+    file.read(reinterpret_cast<char*>(&start), sizeof start);
+    file.seekg(samplesAt + 8 * static_cast<std::streamoff>(start));
+    // Frames and ears are asked for in the order of the file.
+    return tailOf(preset, sampleRate, [&file](int, int, int) {
+        float sample = 0.0f;
+        file.read(reinterpret_cast<char*>(&sample), sizeof sample);
+        return file ? sample : 0.0f;
+    });
 }
 
 bool reflectAtWall(ReflectionRecord& record, int k, const WallScene& scene) {

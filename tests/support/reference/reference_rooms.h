@@ -3,6 +3,7 @@
 
 #include <array>
 #include <functional>
+#include <string>
 
 #include "support/reference/reference_engine.h"
 
@@ -14,6 +15,11 @@ PresetRow presetRowOf(int preset);
 /// A room's tail with its gain and its length at a rate; empty for presets without one.
 /// @param sample  of a preset, frame and ear (0 left), as it stands in the data file
 Tail tailOf(int preset, int sampleRate, const std::function<float(int, int, int)>& sample);
+
+/// The same from "/TSLdata510.dat", 511 or 512 (44100, 48000, 24000 Hz) of a directory, with the
+/// reference's own reader: for preset p a 32-bit start frame at byte 2 + 4 (p - 1), and from byte
+/// 242 + 8 * start on pairs of floats, left first. What the file does not hold is 0.
+Tail packedTailOf(const std::string& directory, int preset, int sampleRate);
 
 /// Where the source is among the walls.
 struct WallScene {
