@@ -25,38 +25,50 @@ inline Spectrum plainRoots(std::size_t n) {
     return roots;
 }
 
-/// X[k] = sum of x[j] e^(-2 pi i j k / n), the n/2 + 1 bins of a real block, straight from the
-/// definition.
+/// X[k] = sum of x[j] e^(-2 pi i j k / n), one bin of a real block, straight from the definition.
+/// @param roots  plainRoots(x.size())
+template <typename Real>
+std::complex<double> plainBin(const std::vector<Real>& x, const Spectrum& roots, std::size_t k) {
+    const std::size_t n = x.size();
+    double re = 0.0;
+    double im = 0.0;
+    for (std::size_t j = 0, at = 0; j < n; ++j, at = (at + k) % n) {
+        re += static_cast<double>(x[j]) * roots[at].real();
+        im += static_cast<double>(x[j]) * roots[at].imag();
+    }
+    return {re, im};
+}
+
+/// All n/2 + 1 bins of a real block.
 template <typename Real>
 Spectrum plainForward(const std::vector<Real>& x) {
-    const std::size_t n = x.size();
-    const Spectrum roots = plainRoots(n);
-    Spectrum bins(n / 2 + 1);
+    const Spectrum roots = plainRoots(x.size());
+    Spectrum bins(x.size() / 2 + 1);
     for (std::size_t k = 0; k < bins.size(); ++k) {
-        double re = 0.0;
-        double im = 0.0;
-        for (std::size_t j = 0, at = 0; j < n; ++j, at = (at + k) % n) {
-            re += static_cast<double>(x[j]) * roots[at].real();
-            im += static_cast<double>(x[j]) * roots[at].imag();
-        }
-        bins[k] = {re, im};
+        bins[k] = plainBin(x, roots, k);
     }
     return bins;
 }
 
 /// x[j] = sum over all n bins of the conjugate-even spectrum, e^(+2 pi i j k / n), no scale
 /// factor; the imaginary parts of the first and the last bin do not count.
-inline std::vector<double> plainBackward(const Spectrum& bins) {
+/// @param roots  plainRoots(2 * (bins.size() - 1))
+inline double plainSample(const Spectrum& bins, const Spectrum& roots, std::size_t j) {
     const std::size_t half = bins.size() - 1;
     const std::size_t n = 2 * half;
-    const Spectrum roots = plainRoots(n);
-    std::vector<double> x(n);
-    for (std::size_t j = 0; j < n; ++j) {
-        double sum = bins[0].real() + (j % 2 == 0 ? 1.0 : -1.0) * bins[half].real();
-        for (std::size_t k = 1, at = j; k < half; ++k, at = (at + j) % n) {
-            sum += 2.0 * (bins[k].real() * roots[at].real() + bins[k].imag() * roots[at].imag());
-        }
-        x[j] = sum;
+    double sum = bins[0].real() + (j % 2 == 0 ? 1.0 : -1.0) * bins[half].real();
+    for (std::size_t k = 1, at = j; k < half; ++k, at = (at + j) % n) {
+        sum += 2.0 * (bins[k].real() * roots[at].real() + bins[k].imag() * roots[at].imag());
+    }
+    return sum;
+}
+
+/// All samples.
+inline std::vector<double> plainBackward(const Spectrum& bins) {
+    std::vector<double> x(2 * (bins.size() - 1));
+    const Spectrum roots = plainRoots(x.size());
+    for (std::size_t j = 0; j < x.size(); ++j) {
+        x[j] = plainSample(bins, roots, j);
     }
     return x;
 }
