@@ -18,10 +18,12 @@ namespace tessaly {
 
 /// What a source plays: a sound file, or a built-in sound by name.
 struct SceneInput {
-    std::filesystem::path file;      ///< absolute or from the working directory; empty: built-in
-    std::string sound;               ///< "pluck", "drums", "bursts", "speech", "impulse"
-    std::string text;                ///< what "speech" says
-    std::optional<double> duration;  ///< seconds of it that are used; all of a file if not given
+    std::filesystem::path file;  ///< absolute or from the working directory; empty: built-in
+    std::string sound;           ///< "pluck", "drums", "bursts", "speech", "impulse"
+    std::string text;            ///< what "speech" says
+    /// Seconds of it that are used; all of a file or of what is said if not given. The other
+    /// built-in sounds have no end of their own: a scene that was read gives them one here.
+    std::optional<double> duration;
 };
 
 /// A parameter of an effect over time, set at the start of each block in which it differs.
