@@ -31,6 +31,7 @@ class BenchTables(unittest.TestCase):
             "Mac/avx2/256/8": ("Mac", "avx2", ("256", "8")),
             "Mac/plain/256/8": ("Mac", "plain", ("256", "8")),
             "Process/moving/tessaly/1024/46": ("Process", "tessaly", ("moving", "1024", "46")),
+            "Load/31/iterations:1/manual_time": ("Load", "time", ("31",)),
             "Engine/compose/48000/real_time": ("Engine", "time", ("compose", "48000")),
         }.items():
             self.assertEqual(bench.split_name(name), parts)
@@ -46,8 +47,8 @@ class BenchTables(unittest.TestCase):
             + report("Mac/plain/256/1/real_time", 3.0, "ns", real=7.0)
         )
         row = groups["Mac"][("256", "1")]
-        self.assertEqual(row["table"], (2000.0, 0.01))
-        self.assertEqual(row["plain"], (7.0, 0.01))
+        self.assertEqual(row["table"], (2000.0, 0.01, None))
+        self.assertEqual(row["plain"], (7.0, 0.01, None))
 
     def test_ratio_is_speed_against_the_reference(self):
         groups = bench.collect(
@@ -71,6 +72,28 @@ class BenchTables(unittest.TestCase):
         text, _ = bench.format_table("Process", groups["Process"])
         self.assertTrue(text[2].endswith(" 25"), text[2])
         self.assertTrue(text[3].endswith(" 2"), text[3])
+
+    def test_sources_are_told_as_share_of_their_block(self):
+        groups = bench.collect(
+            report("Source/hall/still/1024", 1024 / 48000 * 1e9 / 8)
+            + report("Return/alone/64/256/manual_time", 1.0, real=256 / 48000 * 1e9 / 5)
+        )
+        text, records = bench.format_table("Source", groups["Source"])
+        self.assertTrue(text[1].endswith("% of a block at 48 kHz"), text[1])
+        self.assertTrue(text[2].endswith(" 12.5"), text[2])
+        self.assertEqual(records[0]["key"], ["hall", "still", "1024"])
+        text, _ = bench.format_table("Return", groups["Return"])
+        self.assertTrue(text[2].endswith(" 20"), text[2])
+
+    def test_loads_are_told_in_blocks_with_their_worst(self):
+        block = 1024 / 48000 * 1e9
+        entries = report("Load/31/iterations:1/manual_time", 1.0, real=block / 2)
+        entries.append({**entries[0], "aggregate_name": "max", "real_time": block * 1.25})
+        entries += report("Load/9/iterations:1/manual_time", 1.0, real=block / 4)
+        text, records = bench.format_table("Load", bench.collect(entries)["Load"])
+        self.assertTrue(text[2].endswith(" 0.250"), text[2])
+        self.assertEqual(text[3].split()[-2:], ["0.500", "1.250"])
+        self.assertEqual([record["worst_ns"] for record in records], [None, block * 1.25])
 
     def test_a_benchmark_that_reports_an_error_ends_the_run(self):
         with self.assertRaises(SystemExit):
