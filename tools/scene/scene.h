@@ -41,8 +41,8 @@ struct SceneSend {
     int level = 0;     ///< whole dB
 };
 
-/// Builds the source's engine directly, without the library's effect: for features that no
-/// parameter reaches. The engine takes the same position, gain and room as an effect would.
+/// Settings of the source's engine that no parameter of the effect reaches. The effect goes on
+/// giving the engine position, levels and room; it cannot send.
 struct DirectEngine {
     EngineSettings settings;        ///< rate, room and tail preset are filled in by the renderer
     std::int16_t qualityValue = 0;  ///< quality ladder, 0: settings as they stand

@@ -233,10 +233,8 @@ SceneSource readSource(const SceneValue& value, const SourceSurroundings& surrou
         turnOffOwnReverb(value, source);
     }
     if (const std::optional<SceneValue> engine = value.find("engine")) {
-        for (const std::string_view key : {"parameters", "sends"}) {
-            if (const std::optional<SceneValue> effects = value.find(key)) {
-                effects->fail("belongs to the effect: it does not go with \"engine\"");
-            }
+        if (!source.sends.empty()) {
+            value.need("sends").fail("goes through the effect's engine, not with \"engine\"");
         }
         source.engine = readEngine(*engine, surroundings.blockLength);
     }

@@ -192,10 +192,11 @@ TEST(SceneFile, TurnsTheOwnReverbOffWhereItSends) {
 
 TEST(SceneFile, ReadsAnEngine) {
     const Scene scene = parsed(withSource(
-        R"("room": 4, "engine": {"doppler": true, "fading": false, "headphone": 3, "limitPhi": 90,
+        R"("room": 4, "parameters": {"Occlusion": 0.5}, "engine": {"doppler": true, "fading": false, "headphone": 3, "limitPhi": 90,
             "updateInterval": 2, "bypass3DAudio": true, "quality": 7})"));
     ASSERT_TRUE(scene.sources[0].engine);
     const DirectEngine& engine = *scene.sources[0].engine;
+    EXPECT_EQ(scene.sources[0].parameters.size(), 1u);
     EXPECT_EQ(engine.settings.doppler, 1);
     EXPECT_EQ(engine.settings.fading, 0);
     EXPECT_EQ(engine.settings.qvHpTFcompSelect, 3);
