@@ -4,7 +4,9 @@
 #include <algorithm>
 #include <filesystem>
 #include <fstream>
+#include <iterator>
 #include <nlohmann/json.hpp>
+#include <random>
 #include <set>
 #include <span>
 #include <string>
@@ -164,6 +166,51 @@ TEST(SceneExamples, CanBeRead) {
                   std::filesystem::weakly_canonical(TESSALY_SCENE_SCHEMA));
     }
     EXPECT_GE(count, 12);
+}
+
+// Whatever a slip of the hand makes of a scene: it is read, or refused in one line.
+TEST(SceneExamples, SurviveDamage) {
+    constexpr std::string_view slips = "{}[]\",:-.0x9e\n";
+    int refused = 0;
+    for (const auto& entry : std::filesystem::directory_iterator(TESSALY_EXAMPLES)) {
+        std::ifstream stream(entry.path());
+        const std::string text{std::istreambuf_iterator<char>(stream), {}};
+        std::minstd_rand random(7);
+        for (int i = 0; i < 60; ++i) {
+            std::string damaged = text;
+            const std::size_t place = random() % damaged.size();
+            damaged.replace(place, random() % 6, 1, slips[random() % slips.size()]);
+            SCOPED_TRACE(damaged);
+            try {
+                parseScene(damaged, "a.json", ".");
+            } catch (const SceneError& error) {
+                ++refused;
+                const std::string line = error.what();
+                EXPECT_EQ(line.find('\n'), std::string::npos) << line;
+                EXPECT_EQ(line.rfind("a.json:", 0), 0u) << line;
+            }
+        }
+    }
+    EXPECT_GT(refused, 300);  // of 900; many slips fall into words
+}
+
+TEST(SceneExamples, ThePageOfTheFormatShowsAGoodOne) {
+    std::ifstream stream(TESSALY_SCENE_PAGE);
+    const std::string page{std::istreambuf_iterator<char>(stream), {}};
+    const std::string fence = "```json\n";
+    const std::size_t begin = page.find(fence);
+    ASSERT_NE(begin, std::string::npos);
+    const std::size_t end = page.find("```", begin + fence.size());
+    const std::string text = page.substr(begin + fence.size(), end - begin - fence.size());
+    const Scene scene = parseScene(text, "example", ".");
+    EXPECT_EQ(scene.sources.size(), 2u);
+    EXPECT_EQ(scene.returns.size(), 1u);
+    // Every key of the reader is told.
+    for (const scene_keys::ObjectKeys& object : scene_keys::objects) {
+        for (const std::string_view key : object.keys) {
+            EXPECT_NE(page.find(key), std::string::npos) << key;
+        }
+    }
 }
 
 }  // namespace
