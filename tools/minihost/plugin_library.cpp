@@ -113,12 +113,7 @@ PluginLibrary::PluginLibrary(const std::filesystem::path& file) : path(file) {
 }
 
 const UnityAudioEffectDefinition& PluginLibrary::effect(std::string_view name) const {
-    const auto found = std::find_if(definitions.begin(), definitions.end(),
-                                    [&](const auto* one) { return fieldText(one->name) == name; });
-    if (found == definitions.end()) {
-        throw std::runtime_error("library has no effect \"" + std::string(name) + "\"");
-    }
-    return **found;
+    return effectNamed(definitions, name);
 }
 
 void* PluginLibrary::findSymbol(const std::string& name) const noexcept {
@@ -165,6 +160,16 @@ int PluginLibrary::testMethode(int value) const {
 std::string_view fieldText(std::span<const char> field) noexcept {
     const auto end = std::find(field.begin(), field.end(), '\0');
     return {field.data(), static_cast<std::size_t>(end - field.begin())};
+}
+
+const UnityAudioEffectDefinition& effectNamed(std::span<UnityAudioEffectDefinition* const> effects,
+                                              std::string_view name) {
+    const auto found = std::find_if(effects.begin(), effects.end(),
+                                    [&](const auto* one) { return fieldText(one->name) == name; });
+    if (found == effects.end()) {
+        throw std::runtime_error("library has no effect \"" + std::string(name) + "\"");
+    }
+    return **found;
 }
 
 std::span<const UnityAudioParameterDefinition> parametersOf(

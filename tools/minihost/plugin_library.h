@@ -68,6 +68,10 @@ private:
 /// Text of a fixed-size field, which need not be terminated.
 std::string_view fieldText(std::span<const char> field) noexcept;
 
+/// @throws std::runtime_error if there is no effect of that name
+const UnityAudioEffectDefinition& effectNamed(std::span<UnityAudioEffectDefinition* const> effects,
+                                              std::string_view name);
+
 /// Parameters of an effect, in index order.
 std::span<const UnityAudioParameterDefinition> parametersOf(
     const UnityAudioEffectDefinition& definition) noexcept;

@@ -82,6 +82,8 @@ std::size_t writeWav(const PendingFile& file,
     if (!opened) {
         throw cannotWrite(file.passingName(), sf_strerror(nullptr));
     }
+    // The peak chunk carries the time of writing: equal sounds would give different files.
+    sf_command(opened.get(), SFC_SET_ADD_PEAK_CHUNK, nullptr, SF_FALSE);
     // Without clipping, a value beyond full scale would wrap round in the integer formats.
     sf_command(opened.get(), SFC_SET_CLIPPING, nullptr, SF_TRUE);
     std::size_t cut = 0;

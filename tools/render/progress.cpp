@@ -6,6 +6,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <numeric>
 #include <utility>
 
 namespace tessaly {
@@ -42,6 +43,12 @@ void Progress::update(double fraction) {
     lastLine = now;
     const std::chrono::duration<double> elapsed = now - started;
     writeAll(terminal, "\r" + progressLine(taskName, fraction, elapsed.count()) + "\033[K");
+}
+
+void JointProgress::update(std::size_t piece, double fraction) {
+    const std::lock_guard lock(guard);
+    done[piece] = fraction;
+    line.update(std::accumulate(done.begin(), done.end(), 0.0) / static_cast<double>(done.size()));
 }
 
 std::string progressLine(const std::string& task, double fraction, double elapsedSeconds) {

@@ -2,7 +2,11 @@
 #pragma once
 
 #include <chrono>
+#include <cstddef>
+#include <mutex>
 #include <string>
+#include <utility>
+#include <vector>
 
 namespace tessaly {
 
@@ -28,6 +32,21 @@ private:
     std::string taskName;
     Clock::time_point started;
     Clock::time_point lastLine;
+};
+
+/// One line for several pieces of work that go on at once. Any thread.
+class JointProgress {
+public:
+    JointProgress(int descriptor, std::string task, std::size_t pieces)
+        : line(descriptor, std::move(task)), done(pieces) {}
+
+    /// @param fraction  of this piece done, 0 to 1
+    void update(std::size_t piece, double fraction);
+
+private:
+    std::mutex guard;
+    Progress line;
+    std::vector<double> done;
 };
 
 /// Text of the line, e.g. "rendering  43 %, 12 s left".
