@@ -67,6 +67,74 @@ void HostedSource::setFormat(int sampleRate, int blockLength) {
            << state.samplerate << " Hz: " << difference;
 }
 
+HostedReturn::HostedReturn(Game& game, int sampleRate, int blockLength, int id)
+    : game_(game),
+      id_(id),
+      effect_(game.library.effect("Tessaly Reverb"),
+              static_cast<std::uint32_t>(sampleRate),
+              static_cast<std::uint32_t>(blockLength)),
+      reference_(game.process),
+      in_(static_cast<std::size_t>(2 * blockLength), 9.0f),  // the host's input is not heard
+      out_(in_.size()) {
+    constexpr std::size_t mixBufferSize = 8192;
+    constexpr float silenceDb = -96.0f;
+    reference_.fading = false;
+    reference_.earlyGainDb = silenceDb;
+    reference_.directGainDb = silenceDb;
+    reference_.alwaysUpdateFilter = false;
+    EXPECT_EQ(effect_.setParameter(return_parameter::reverbId, static_cast<float>(id)), 0);
+    game_.process.mixBuffers[id].assign(mixBufferSize, 0.0);
+}
+
+HostedReturn::~HostedReturn() { game_.process.mixBuffers.erase(id_); }
+
+void HostedReturn::set(int index, float value) {
+    EXPECT_EQ(effect_.setParameter(index, value), 0);
+    switch (index) {
+        case return_parameter::gain:
+            reference_.masterGainDb = value;
+            break;
+        case return_parameter::reverb:
+            reference_.reverbGainDb = value;
+            break;
+        case return_parameter::roomSelection:
+            reference_.roomPreset = static_cast<int>(value);
+            break;
+        case return_parameter::mute:
+            reference_.reverbActive = value < 1.0f;
+            break;
+        case return_parameter::roomSize:
+            reference_.roomSize = static_cast<float>((static_cast<double>(value) - 50.0) * 0.02);
+            break;
+        case return_parameter::bypass:
+            reference_.bypassExternal = value >= 1.0f;
+            break;
+        default:
+            ADD_FAILURE() << "parameter " << index << " is not the reference's";
+    }
+}
+
+::testing::AssertionResult HostedReturn::play(Deviation& deviation) {
+    const int frames = static_cast<int>(effect_.state().dspbuffersize);
+    std::fill(out_.begin(), out_.end(), 7.0f);
+    const int result = effect_.processBlock(in_.data(), out_.data(), effect_.state().dspbuffersize);
+    reference_.checkForChanges(static_cast<int>(effect_.state().samplerate), frames);
+    expected_.assign(out_.size(), 0.0);
+    if (reference_.isLoaded()) {
+        std::vector<double>& mix = game_.process.mixBuffers.at(id_);
+        reference_.processBlock(std::span<const double>(mix).first(out_.size()), frames, 2,
+                                expected_);
+        std::fill_n(mix.begin(), out_.size(), 0.0);
+    }
+    const std::string difference = deviation.compare(out_, expected_);
+    ++block_;
+    if (result == 0 && difference.empty()) {
+        return ::testing::AssertionSuccess();
+    }
+    return ::testing::AssertionFailure() << "return " << id_ << ", result " << result << ", block "
+                                         << block_ - 1 << ": " << difference;
+}
+
 void walk(HostedSource& one, int block) {
     const double t = 0.13 * block;
     one.listener.position = {0.4 * std::sin(t), 0.3 * std::cos(0.7 * t), 0.2 * t};

@@ -65,9 +65,12 @@ public:
     /// @param frames  0 for the mixer's block length
     ::testing::AssertionResult play(Deviation& deviation, int inChannels = 2, int frames = 0);
 
+    /// Starts the noise anew with a seed.
+    void seedNoise(unsigned seed) { noise_.seed(seed); }
+
     reference::Handler& handler() { return reference_.handler; }
-    /// The reference's last block, interleaved stereo.
-    const std::vector<double>& expected() const { return expected_; }
+    /// The last block of the library, interleaved stereo.
+    const std::vector<float>& heard() const { return out_; }
 
     Pose listener;
     Pose source{{0.0, 0.0, 1.0}};
@@ -78,6 +81,48 @@ private:
     EffectInstance effect_;
     reference::Spatializer reference_;
     std::mt19937 noise_{5};
+    std::vector<float> in_;
+    std::vector<float> out_;
+    std::vector<double> expected_;
+    int block_ = 0;
+};
+
+/// Parameter indices of the return.
+namespace return_parameter {
+inline constexpr int gain = 0;
+inline constexpr int reverb = 1;
+inline constexpr int roomSelection = 2;
+inline constexpr int mute = 3;
+inline constexpr int roomSize = 5;
+inline constexpr int bypass = 7;
+inline constexpr int reverbId = 8;
+}  // namespace return_parameter
+
+/// A return: the effect of the library, and the reference's handler that reads the mix buffer of
+/// its ID.
+class HostedReturn {
+public:
+    /// @param id  above 0, taken by nobody else
+    HostedReturn(Game& game, int sampleRate, int blockLength, int id);
+    ~HostedReturn();
+    HostedReturn(const HostedReturn&) = delete;
+    HostedReturn& operator=(const HostedReturn&) = delete;
+
+    /// A parameter of both, all but the ID.
+    void set(int index, float value);
+
+    /// One block, compared; what the sources have sent is taken from both.
+    ::testing::AssertionResult play(Deviation& deviation);
+
+    reference::Handler& handler() { return reference_; }
+    /// The last block of the library, interleaved stereo.
+    const std::vector<float>& heard() const { return out_; }
+
+private:
+    Game& game_;
+    int id_;
+    EffectInstance effect_;
+    reference::Handler reference_;
     std::vector<float> in_;
     std::vector<float> out_;
     std::vector<double> expected_;

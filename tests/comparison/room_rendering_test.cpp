@@ -4,26 +4,21 @@
 
 #include <algorithm>
 #include <array>
-#include <cmath>
 #include <cstdio>
-#include <filesystem>
-#include <map>
 #include <ostream>
 #include <sstream>
 #include <string>
-#include <utility>
 #include <vector>
 
 #include "comparison/deviation.h"
 #include "comparison/hosted_source.h"
-#include "support/reference/reference_rooms.h"
+#include "comparison/measured_game.h"
 
 namespace tessaly::test {
 namespace {
 
 using namespace parameter;
 
-constexpr int roomCount = 53;
 constexpr int burstBlocks = 6;
 constexpr float noisePeak = 0.5f;
 
@@ -42,13 +37,6 @@ public:
 };
 const ::testing::Environment* const tellsTheLargest =
     ::testing::AddGlobalTestEnvironment(new TellsTheLargest);
-
-const std::string dataDirectory = TESSALY_TEST_DATA;
-
-Game& game() {
-    static Game theGame(dataDirectory);
-    return theGame;
-}
 
 struct RoomCase {
     int room = 0;
@@ -99,19 +87,13 @@ std::vector<RoomCase> roomsInOtherFormats() {
 class RoomRendering : public ::testing::TestWithParam<RoomCase> {
 protected:
     void SetUp() override {
-        if (!std::filesystem::exists(dataDirectory + "/TSLdata511.dat")) {
-            GTEST_SKIP() << "no data set in " << dataDirectory;
+        if (!measuredSetThere()) {
+            GTEST_SKIP() << "no data set";
         }
-        one_.handler().adjustOptions = [](reference::EngineOptions& options) {
-            options.presetRow = reference::presetRowOf(options.earlyFlexRefPreset);
-            if (options.qvReverb > 0) {
-                options.tail =
-                    reference::packedTailOf(dataDirectory, options.qvReverb, options.sampleRate);
-            }
-        };
+        takeRooms(one_.handler());
         set(roomSelection, static_cast<float>(GetParam().room));
-        ASSERT_TRUE(game().pathTaken);
-        ASSERT_EQ(game().library.getErrorState(), 1);
+        ASSERT_TRUE(measuredGame().pathTaken);
+        ASSERT_EQ(measuredGame().library.getErrorState(), 1);
     }
 
     void TearDown() override {
@@ -129,7 +111,7 @@ protected:
         EXPECT_LE(deviation.largest(), tolerance);
         EXPECT_GT(deviation.peak(), 0.05) << "silence was compared with silence";
         EXPECT_LT(deviation.peak(), 1.0) << "beyond the full scale that the tolerance is told of";
-        EXPECT_EQ(game().library.getErrorState(), 1);
+        EXPECT_EQ(measuredGame().library.getErrorState(), 1);
     }
 
     /// Blocks of noise on the way.
@@ -158,20 +140,13 @@ protected:
 
     void set(int index, float value) { one_.set(index, value); }
 
-    /// The walls of both.
-    static void setWalls(const std::array<float, 6>& metres) {
-        game().library.setRoomDistances(metres);
-        game().process.roomDistances = metres;
-        game().process.roomDistancesSet = true;
-    }
-
     double away = 0.0;  ///< metres added to the walk
     const char* what = "";
     Deviation deviation;
 
 private:
     int block_ = 0;
-    HostedSource one_{game(), GetParam().sampleRate, GetParam().blockLength};
+    HostedSource one_{measuredGame(), GetParam().sampleRate, GetParam().blockLength};
 };
 
 TEST_P(RoomRendering, MovingSourceUntilTheTailHasRunOut) { playOut(); }
