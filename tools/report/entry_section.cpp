@@ -73,9 +73,12 @@ std::string parametersMarkup(const std::vector<ReportParameter>& parameters) {
                               escapedXml(row->owner));
         const std::string& owner = row->owner;
         for (; row != parameters.end() && row->owner == owner; ++row) {
-            bodies += fmt::format("<tr><th scope=\"row\">{}</th><td>{}{}{}</td></tr>\n",
-                                  escapedXml(row->name), escapedXml(row->value),
-                                  row->unit.empty() ? "" : " ", escapedXml(row->unit));
+            const std::string unit =
+                row->unit.empty()
+                    ? std::string()
+                    : fmt::format(" <span class=\"unit\">{}</span>", escapedXml(row->unit));
+            bodies += fmt::format("<tr><th scope=\"row\">{}{}</th><td>{}</td></tr>\n",
+                                  escapedXml(row->name), unit, escapedXml(row->value));
         }
         bodies += "</tbody>\n";
     }

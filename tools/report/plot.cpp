@@ -41,8 +41,8 @@ std::string plotMarkup(const Plot& plot) {
     text += "</span>";
     if (plot.ears) {
         text +=
-            "<span class=\"legend\"><span class=\"key left\">left ear</span>"
-            "<span class=\"key right\">right ear</span></span>";
+            "<span class=\"legend\"><span class=\"key left\">left</span>"
+            "<span class=\"key right\">right</span></span>";
     }
     text += "</figcaption>\n";
     const std::string seek =

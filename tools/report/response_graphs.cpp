@@ -49,8 +49,8 @@ float peakOf(const Ears& ears) {
 }
 
 const LineStyle& lineOf(std::size_t ear, bool thin) {
-    static constexpr std::array<LineStyle, 4> styles = {{{.colour = leftColour, .width = 2.5},
-                                                         {.colour = rightColour, .width = 2.5},
+    static constexpr std::array<LineStyle, 4> styles = {{{.colour = leftColour, .width = 3.6},
+                                                         {.colour = rightColour, .width = 2.0},
                                                          {.colour = leftColour, .width = 1.2},
                                                          {.colour = rightColour, .width = 1.2}}};
     return styles[ear + (thin ? 2 : 0)];
@@ -118,9 +118,8 @@ std::string arrivalGraph(const Ears& ears, int sampleRate) {
     }
     Plot plot;
     plot.title = "Impulse response";
-    plot.unit = "direct sound and first reflections";
-    plot.ears = true;
-    plot.kind = "middle";
+    plot.unit = "first 80 ms";
+    plot.kind = "high";
     plot.label = "Impulse response, its first 80 milliseconds." + arrivalWords(ears, sampleRate);
     plot.across = ticksOf(times, 6, "ms");
     plot.upright = {{lanes.place(1.1, 0.0, 1.0), "left"}, {lanes.place(-1.1, 0.0, 1.0), "right"}};
@@ -212,12 +211,12 @@ std::string decayGraph(const Ears& ears, int sampleRate) {
     }
     Plot plot;
     plot.title = "Energy decay";
-    plot.unit = "dB; thin: the level meanwhile";
+    plot.unit = "dB, thin: level";
     plot.ears = true;
-    plot.kind = "middle";
+    plot.kind = "high";
     plot.label = "Energy decay curve of both ears." + words;
     plot.across = ticksOf(times, 6, "s");
-    plot.upright = ticksOf(levels, 4, "");
+    plot.upright = ticksOf(levels, 5, "");
     plot.body = curvesMarkup(times, levels, plot.across, plot.upright, curves);
     return plotMarkup(plot);
 }

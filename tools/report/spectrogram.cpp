@@ -16,7 +16,8 @@ namespace {
 constexpr int mostColumns = 720;
 constexpr int rowCount = 208;            // 24 an octave
 constexpr double windowSeconds = 0.085;  // 4096 frames at 48 kHz
-constexpr double noiseBandwidth = 1.5;   // bins, of the raised cosine
+constexpr double leastBins = 2.0;
+constexpr double noiseBandwidth = 1.5;  // bins, of the raised cosine
 
 std::vector<double> windowOf(std::size_t length) {
     std::vector<double> window(length);
@@ -28,10 +29,10 @@ std::vector<double> windowOf(std::size_t length) {
 }
 
 // Power between two places on the axis of bins, bins being boxes one wide about their numbers. A
-// band narrower than a bin takes a whole bin's width.
+// narrow band takes two bins' width: less would lose a part of a line.
 double powerBetween(const std::vector<double>& sums, double low, double high) {
     const double middle = 0.5 * (low + high);
-    const double width = std::max(high - low, 1.0);
+    const double width = std::max(high - low, leastBins);
     const auto sumTo = [&](double place) {
         const double bounded = std::clamp(place, 0.0, static_cast<double>(sums.size() - 1));
         const auto whole = std::min(static_cast<std::size_t>(bounded), sums.size() - 2);

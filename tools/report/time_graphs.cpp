@@ -27,8 +27,9 @@ constexpr double shownSpectrum = 80.0;      // dB from the brightest colour to t
 constexpr double quietestSpectrum = -60.0;  // dB; the brightest colour is never below it
 constexpr int timeTicks = 8;
 
-constexpr LineStyle leftLine{.colour = leftColour, .width = 2.0};
-constexpr LineStyle rightLine{.colour = rightColour, .width = 2.0};
+// Where both ears receive the same, the right one's line lies within the left one's.
+constexpr LineStyle leftLine{.colour = leftColour, .width = 3.2};
+constexpr LineStyle rightLine{.colour = rightColour, .width = 1.6};
 constexpr LineStyle differenceLine{.colour = "var(--ink)", .width = 2.0};
 
 using Value = std::function<std::optional<double>(const BinauralPoint&)>;
