@@ -225,10 +225,15 @@ void takePicture(RenderOptions& options, const TypedOptions& typed) {
         refuse(typed.picture, "--picture", "--no-picture");
         return;
     }
-    options.picture = typed.picture.empty() ? options.output : std::filesystem::path(typed.picture);
     if (typed.picture.empty()) {
-        options.picture.replace_extension(".svg");
-    } else if (!endsIn(options.picture, ".svg")) {
+        options.picture = options.output;
+        if (!options.picture.empty()) {
+            options.picture.replace_extension(".svg");
+        }
+        return;
+    }
+    options.picture = typed.picture;
+    if (!endsIn(options.picture, ".svg")) {
         throw UsageError("the picture is an SVG file: " + typed.picture + " must end in .svg");
     }
 }

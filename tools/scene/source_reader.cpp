@@ -4,7 +4,6 @@
 #include <fmt/format.h>
 
 #include <algorithm>
-#include <array>
 #include <cmath>
 #include <cstdint>
 #include <string>
@@ -12,6 +11,7 @@
 #include <system_error>
 
 #include "host/parameter_tables.h"
+#include "scene/engine_keys.h"
 #include "scene/near_names.h"
 #include "scene/parameter_reader.h"
 #include "scene/scene_keys.h"
@@ -125,38 +125,6 @@ void turnOffOwnReverb(const SceneValue& value, SceneSource& source) {
             "needs the parameter \"{}\" at 1 or above, or left out: it is never", reverbDisable));
     }
 }
-
-struct EngineSwitch {
-    std::string_view key;
-    std::uint8_t EngineSettings::*field;
-};
-constexpr std::array<EngineSwitch, 12> engineSwitches = {{
-    {"interpolateSpectra", &EngineSettings::qvInterpolateSpectra},
-    {"interpolateFilters", &EngineSettings::qvInterpolateFilters},
-    {"earlyReflections", &EngineSettings::qvEarlyReflections},
-    {"flexReflections", &EngineSettings::qvFlexReflections},
-    {"smoothSteps", &EngineSettings::qvSmoothSteps},
-    {"fading", &EngineSettings::fading},
-    {"trackDirection", &EngineSettings::qvTrackDirection},
-    {"use256HRIR", &EngineSettings::qvUse256HRIR},
-    {"alwaysUpdateFilter", &EngineSettings::alwaysUpdateFilter},
-    {"auralisation", &EngineSettings::auralisation},
-    {"doppler", &EngineSettings::doppler},
-    {"bypass3DAudio", &EngineSettings::bypass3DAudio},
-}};
-
-struct EngineNumber {
-    std::string_view key;
-    std::int16_t EngineSettings::*field;
-    int low;
-    int high;
-};
-constexpr std::array<EngineNumber, 4> engineNumbers = {{
-    {"headphone", &EngineSettings::qvHpTFcompSelect, 0, 10},
-    {"limitPhi", &EngineSettings::limitPhi, 0, 180},
-    {"limitTheta", &EngineSettings::limitTheta, 0, 90},
-    {"updateInterval", &EngineSettings::qvUpdateInterval, 1, 1000},
-}};
 
 DirectEngine readEngine(const SceneValue& value, int blockLength) {
     value.allowOnly(scene_keys::engine);

@@ -102,6 +102,75 @@ TEST(Options, ListingNeedsNothingElse) { EXPECT_TRUE(parse({"--list"}).list); }
 
 TEST(Options, HelpIsNoFailure) { EXPECT_THROW(parse({"--help"}), HelpRequest); }
 
+TEST(Options, EveryRoomGoesIntoADirectory) {
+    const RenderOptions options = parse({"in.wav", "--room", "all", "-o", "rooms"});
+    EXPECT_TRUE(options.everyRoom);
+    EXPECT_TRUE(options.roomPictures);
+    EXPECT_EQ(options.output, "rooms");
+    EXPECT_TRUE(options.picture.empty());
+    EXPECT_FALSE(parse({"in.wav", "--room", "All", "-o", "rooms", "--no-picture"}).roomPictures);
+    EXPECT_FALSE(parseWith({"--room", "3"}).everyRoom);
+}
+
+TEST(Options, APageCanStandInForTheSound) {
+    const RenderOptions options = parse({"in.wav", "--report", "page"});
+    EXPECT_EQ(options.report, "page");
+    EXPECT_TRUE(options.output.empty());
+    EXPECT_TRUE(options.picture.empty());
+    EXPECT_EQ(parseWith({"--report", "page"}).output, "x.wav");
+}
+
+TEST(Options, ScenesMayBeSeveralOnAPage) {
+    const RenderOptions one = parse({"--scene", "a.json", "-o", "a.wav"});
+    ASSERT_EQ(one.scenes.size(), 1u);
+    EXPECT_EQ(one.scenes[0], "a.json");
+    EXPECT_EQ(one.output, "a.wav");
+    EXPECT_TRUE(one.picture.empty());
+    const RenderOptions two = parse({"--scene", "a.json", "--scene", "b.json", "--report", "page"});
+    ASSERT_EQ(two.scenes.size(), 2u);
+    EXPECT_EQ(two.scenes[1], "b.json");
+}
+
+TEST(Options, RateAndBlockOfASceneAreOverriddenOnRequestOnly) {
+    const RenderOptions plain = parse({"--scene", "a.json", "-o", "a.wav"});
+    EXPECT_FALSE(plain.rateGiven);
+    EXPECT_FALSE(plain.blockGiven);
+    const RenderOptions other =
+        parse({"--scene", "a.json", "-o", "a.wav", "--rate", "44100", "--block", "256"});
+    EXPECT_TRUE(other.rateGiven);
+    EXPECT_TRUE(other.blockGiven);
+    EXPECT_EQ(other.sampleRate, 44100);
+    EXPECT_EQ(other.blockLength, 256);
+}
+
+TEST(Options, WhatASceneTellsIsNotTakenFromTheCommandLine) {
+    const std::vector<std::vector<const char*>> told = {{"in.wav"},
+                                                        {"--sound", "pluck"},
+                                                        {"--text", "x"},
+                                                        {"--orbit"},
+                                                        {"--radius", "2"},
+                                                        {"--turns", "2"},
+                                                        {"--period", "2"},
+                                                        {"--elevation", "2"},
+                                                        {"--azimuth", "2"},
+                                                        {"--at", "0,0,1"},
+                                                        {"--rise", "0,90"},
+                                                        {"--room", "3"},
+                                                        {"--room", "all"},
+                                                        {"--set", "Direct=-6"},
+                                                        {"--loop"},
+                                                        {"--duration", "2"},
+                                                        {"--at-xyz", "0,0,1"},
+                                                        {"--from", "0,0,1", "--to", "0,0,2"},
+                                                        {"--direction", "clockwise"},
+                                                        {"--picture", "x.svg"}};
+    for (std::vector<const char*> words : told) {
+        const std::string option = words[0][0] == '-' ? words[0] : "a sound file";
+        words.insert(words.begin(), {"--scene", "a.json", "-o", "a.wav"});
+        EXPECT_THAT(failureOf(words), HasSubstr(option + " has no meaning for --scene"));
+    }
+}
+
 struct Refusal {
     std::vector<const char*> words;
     const char* says;
@@ -153,6 +222,14 @@ TEST(Options, RefusalsSayWhatIsWrong) {
     EXPECT_THAT(failureOf({"-o", "x.wav"}), HasSubstr("no sound given"));
     EXPECT_THAT(failureOf({"in.wav"}), HasSubstr("no output given"));
     EXPECT_THAT(failureOf({"in.wav", "-o", "x.flac"}), HasSubstr("must end in .wav"));
+    EXPECT_THAT(failureOf({"in.wav", "--room", "all"}), HasSubstr("-o DIR for all rooms"));
+    EXPECT_THAT(failureOf({"in.wav", "--room", "all", "-o", "d", "--picture", "x.svg"}),
+                HasSubstr("--picture has no meaning for --room all"));
+    EXPECT_THAT(failureOf({"--room", "all", "-o", "d"}), HasSubstr("no sound given"));
+    EXPECT_THAT(failureOf({"--scene", "a.json"}), HasSubstr("no output given"));
+    EXPECT_THAT(failureOf({"--scene", "a.json", "-o", "x.flac"}), HasSubstr("must end in .wav"));
+    EXPECT_THAT(failureOf({"--scene", "a.json", "--scene", "b.json", "-o", "x.wav"}),
+                HasSubstr("-o takes one --scene"));
 }
 
 }  // namespace

@@ -6,6 +6,7 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <csignal>
 #include <cstdio>
 
 namespace tessaly {
@@ -23,7 +24,9 @@ std::string contentOf(std::FILE* file) {
 
 }  // namespace
 
-ProgramRun runProgram(const std::string& program, const std::vector<std::string>& arguments) {
+ProgramRun interruptProgram(const std::string& program,
+                            const std::vector<std::string>& arguments,
+                            const std::function<bool()>& ready) {
     std::vector<std::string> words = {program};
     words.insert(words.end(), arguments.begin(), arguments.end());
     std::vector<char*> pointers;
@@ -41,6 +44,17 @@ ProgramRun runProgram(const std::string& program, const std::vector<std::string>
     pid_t child = 0;
     ProgramRun run;
     if (posix_spawn(&child, program.c_str(), &actions, nullptr, pointers.data(), environ) == 0) {
+        if (ready) {
+            // WNOWAIT: a program that ends early is still collected below.
+            siginfo_t ended{};
+            while (!ready() &&
+                   waitid(P_PID, static_cast<id_t>(child), &ended, WEXITED | WNOHANG | WNOWAIT) ==
+                       0 &&
+                   ended.si_pid == 0) {
+                usleep(1000);
+            }
+            kill(child, SIGTERM);
+        }
         int status = 0;
         if (waitpid(child, &status, 0) == child && WIFEXITED(status)) {
             run.exitCode = WEXITSTATUS(status);
@@ -52,6 +66,10 @@ ProgramRun runProgram(const std::string& program, const std::vector<std::string>
     std::fclose(output);
     std::fclose(errors);
     return run;
+}
+
+ProgramRun runProgram(const std::string& program, const std::vector<std::string>& arguments) {
+    return interruptProgram(program, arguments, nullptr);
 }
 
 }  // namespace tessaly

@@ -1,6 +1,7 @@
 // Runs a built program and keeps what it says.
 #pragma once
 
+#include <functional>
 #include <string>
 #include <vector>
 
@@ -14,5 +15,10 @@ struct ProgramRun {
 
 /// Runs it without a shell and waits for its end.
 ProgramRun runProgram(const std::string& program, const std::vector<std::string>& arguments);
+
+/// Runs it, sends SIGTERM once `ready` says so, and waits for its end.
+ProgramRun interruptProgram(const std::string& program,
+                            const std::vector<std::string>& arguments,
+                            const std::function<bool()>& ready);
 
 }  // namespace tessaly

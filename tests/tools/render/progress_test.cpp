@@ -2,7 +2,10 @@
 #include "render/progress.h"
 
 #include <gtest/gtest.h>
+#include <pty.h>
 #include <unistd.h>
+
+#include <string>
 
 namespace tessaly {
 namespace {
@@ -29,6 +32,26 @@ TEST(Progress, SaysNothingIntoAPipe) {
     char byte = 0;
     EXPECT_EQ(read(ends[0], &byte, 1), 0);
     close(ends[0]);
+}
+
+// A terminal of our own shows what is written to it.
+TEST(Progress, PiecesThatGoOnAtOnceShareOneLine) {
+    int terminal = -1;
+    int screen = -1;
+    if (openpty(&screen, &terminal, nullptr, nullptr, nullptr) != 0) {
+        GTEST_SKIP() << "no terminals here";
+    }
+    {
+        JointProgress progress(terminal, "rendering", 4);
+        progress.update(0, 1.0);
+        usleep(150000);
+        progress.update(3, 0.5);
+        char text[200] = {};
+        ASSERT_GT(read(screen, text, sizeof text - 1), 0);
+        EXPECT_NE(std::string(text).find("rendering  37 %"), std::string::npos) << text;
+    }
+    close(terminal);
+    close(screen);
 }
 
 }  // namespace

@@ -266,5 +266,155 @@ TEST_F(RenderProgram, LibraryLogIsShownOnRequestOnly) {
                 HasSubstr("chatter of the library"));
 }
 
+// ---- Scenes, pages, all rooms ----
+
+class SceneProgram : public RenderProgram {
+protected:
+    void SetUp() override {
+        RenderProgram::SetUp();
+        std::ofstream(folder / "data" / "TSLdata511.dat") << "data";
+    }
+
+    std::string scene(const std::string& name, const std::string& text) const {
+        const std::string file = inFolder(("data/" + name).c_str());
+        std::ofstream(file) << text;
+        return file;
+    }
+
+    static std::string contentOf(const std::filesystem::path& file) {
+        std::ostringstream text;
+        text << std::ifstream(file, std::ios::binary).rdbuf();
+        return text.str();
+    }
+};
+
+constexpr const char* sideScene =
+    R"({"title": "On the right", "duration": 0.5, "block": 512, "sources": [{"sound": "bursts",
+        "position": {"azimuth": 90, "elevation": 0, "distance": 1.5}}]})";
+
+TEST_F(SceneProgram, AOneSourceSceneIsTheSameAsTheSingleSound) {
+    const std::string file = scene("side.json", sideScene);
+    ASSERT_EQ(run({"--scene", file, "-o", inFolder("scene.wav")}).errors, "");
+    ASSERT_EQ(run({"--sound", "bursts", "--duration", "0.5", "--at", "90,0,1.5", "-o",
+                   inFolder("single.wav"), "--no-picture"})
+                  .errors,
+              "");
+    EXPECT_EQ(contentOf(folder / "scene.wav"), contentOf(folder / "single.wav"));
+    EXPECT_EQ(written(), (std::vector<std::string>{"scene.wav", "single.wav"}));
+}
+
+TEST_F(SceneProgram, RateAndBlockCanBeOverridden) {
+    std::ofstream(folder / "data" / "TSLdata122.dat") << "data";
+    const std::string file = scene("side.json", sideScene);
+    ASSERT_EQ(run({"--scene", file, "-o", inFolder("out.wav"), "--rate", "24000", "--block", "64"})
+                  .errors,
+              "");
+    const Sound sound = readSoundFile(folder / "out.wav", 10.0);
+    EXPECT_EQ(sound.sampleRate, 24000.0);
+    EXPECT_EQ(sound.frames(), 12000u);
+}
+
+TEST_F(SceneProgram, SeveralScenesMakeOnePage) {
+    const std::string one = scene("side.json", sideScene);
+    const std::string two =
+        scene("untitled.json",
+              R"({"duration": 0.3, "sources": [{"sound": "pluck"}, {"sound": "drums"}]})");
+    const ProgramRun done = run({"--scene", one, "--scene", two, "--report", inFolder("page")});
+    ASSERT_EQ(done.exitCode, 0) << done.errors;
+    EXPECT_EQ(done.errors, "");
+    EXPECT_EQ(written(), std::vector<std::string>{"page"});
+    const std::string page = contentOf(folder / "page" / "index.html");
+    EXPECT_THAT(page, HasSubstr("On the right"));
+    EXPECT_THAT(page, HasSubstr("untitled")) << "a scene without a title has its file's name";
+    EXPECT_THAT(page, HasSubstr("drums at 0.1 s")) << "a response";
+}
+
+TEST_F(SceneProgram, SingleSoundsHavePagesToo) {
+    ASSERT_EQ(run({"--sound", "bursts", "--duration", "0.5", "--report", inFolder("page")}).errors,
+              "");
+    EXPECT_EQ(written(), std::vector<std::string>{"page"});
+    EXPECT_THAT(contentOf(folder / "page" / "index.html"), HasSubstr("bursts: orbit at 1.5 m"));
+}
+
+TEST_F(SceneProgram, BadScenesAreRefusedInOneLine) {
+    const std::string bad = scene("bad.json", "{\n \"sources\": [{\"sound\": \"harp\"}]\n}\n");
+    const ProgramRun refused = run({"--scene", bad, "-o", inFolder("out.wav")});
+    expectRefused(refused, "bad.json:2: sources[0].sound");
+    EXPECT_EQ(refused.exitCode, 1);
+    expectRefused(run({"--scene", inFolder("none.json"), "-o", inFolder("out.wav")}), "none.json");
+    const ProgramRun misused = run({"--scene", bad, "--room", "3", "-o", inFolder("out.wav")});
+    expectRefused(misused, "--room has no meaning for --scene");
+    EXPECT_EQ(misused.exitCode, 2);
+    std::filesystem::remove(folder / "data" / "TSLdata511.dat");
+    const std::string hall =
+        scene("hall.json", R"({"duration": 0.1, "sources": [{"sound": "pluck", "room": 5}]})");
+    expectRefused(run({"--scene", hall, "-o", inFolder("out.wav")}),
+                  "no tail for room 5 (FamousConcerthall)");
+}
+
+TEST_F(SceneProgram, ASceneNeverOverwritesWhatItPlays) {
+    ASSERT_EQ(render({}).exitCode, 0);
+    const std::string before = contentOf(folder / "out.wav");
+    const std::string file =
+        scene("echo.json", R"({"sources": [{"file": "../out.wav"}, {"sound": "pluck"}]})");
+    const ProgramRun refused = run({"--scene", file, "-o", inFolder("out.wav")});
+    EXPECT_EQ(refused.exitCode, 1);
+    EXPECT_THAT(refused.errors, HasSubstr("is the input and cannot be the output too"));
+    EXPECT_EQ(contentOf(folder / "out.wav"), before);
+}
+
+TEST_F(SceneProgram, EveryRoomHasASoundAndAPicture) {
+    const std::vector<std::string> request = {"--sound", "bursts", "--duration", "0.1",
+                                              "--room",  "all",    "-o",         inFolder("rooms")};
+    ASSERT_EQ(run(request).errors, "");
+    std::size_t sounds = 0;
+    for (const auto& entry : std::filesystem::directory_iterator(folder / "rooms")) {
+        const bool isSound = entry.path().extension() == ".wav";
+        sounds += isSound ? 1 : 0;
+        if (!isSound) {
+            EXPECT_EQ(xmlFault(contentOf(entry.path())), "") << entry.path();
+        }
+        std::filesystem::path other = entry.path();
+        EXPECT_TRUE(std::filesystem::exists(other.replace_extension(isSound ? ".svg" : ".wav")))
+            << entry.path();
+    }
+    EXPECT_EQ(sounds, 53u);
+    EXPECT_TRUE(std::filesystem::exists(folder / "rooms" / "22_Small_Livingroom.wav"));
+    ASSERT_EQ(
+        run({"--sound", "bursts", "--duration", "0.1", "--room", "22", "-o", inFolder("one.wav")})
+            .errors,
+        "");
+    for (const char* extension : {".wav", ".svg"}) {
+        EXPECT_EQ(contentOf(folder / ("one" + std::string(extension))),
+                  contentOf(folder / "rooms" / ("22_Small_Livingroom" + std::string(extension))));
+    }
+}
+
+TEST_F(SceneProgram, EveryRoomOrNone) {
+    const ProgramRun failed = run({"--sound", "bursts", "--duration", "0.1", "--room", "all", "-o",
+                                   inFolder("rooms"), "--set", "Misbehave=2"});
+    expectRefused(failed, "the library reports error -105");
+    std::ofstream(folder / "taken") << "a file";
+    const ProgramRun refused = run({"--sound", "bursts", "--room", "all", "-o", inFolder("taken")});
+    EXPECT_EQ(refused.exitCode, 1);
+    EXPECT_THAT(refused.errors, HasSubstr("cannot write"));
+    EXPECT_EQ(contentOf(folder / "taken"), "a file");
+}
+
+TEST_F(SceneProgram, AnInterruptLeavesNothing) {
+    const ProgramRun ended =
+        interruptProgram(TESSALY_RENDER,
+                         {"--library", TESSALY_MOCK_PLUGIN, "--data", inFolder("data"), "--sound",
+                          "bursts", "--duration", "60", "--room", "all", "-o", inFolder("rooms")},
+                         [this] {
+                             std::error_code ignored;
+                             return std::filesystem::exists(folder / "rooms", ignored) &&
+                                    !std::filesystem::is_empty(folder / "rooms", ignored);
+                         });
+    EXPECT_EQ(ended.exitCode, 130);
+    EXPECT_THAT(ended.errors, HasSubstr("interrupted, nothing written"));
+    EXPECT_THAT(written(), ::testing::IsEmpty());
+}
+
 }  // namespace
 }  // namespace tessaly
