@@ -175,6 +175,35 @@ TEST_F(EngineHeadphone, OnlyTheFirstEngineWatchesTheSelection) {
     EXPECT_EQ(qvHpTFcompSelect, 3);
 }
 
+TEST_F(EngineHeadphone, OnlyTheFirstEngineLoadsAtTheStart) {
+    writeFilter("/770ALIF3_CUB_Mono.wav", 0, 1.0f);
+    const auto first = built(1024, 0);
+    const auto second = built(1024, 3);
+    EXPECT_TRUE(hpTFactive) << "switched on for the process";
+    EXPECT_EQ(hpTFfilter, nullptr) << "but nobody loaded it";
+    for (const float sample : play(*second, 2)) {
+        ASSERT_EQ(sample, 0.0f);
+    }
+    play(*first, 1);
+    EXPECT_FALSE(hpTFactive) << "the first engine's own selection is 0";
+    EXPECT_EQ(qvHpTFcompSelect, 0);
+}
+
+TEST_F(EngineHeadphone, TinyBlocksTakeTheEndOfTheSmallFilter) {
+    const std::vector<float> dry = plain(128, 1);
+    resetProcess();
+    writeFilter("/IP23M3_512_FadeOut", 128, 0.9f);  // the first value that 128 frames keep
+    const auto rig = built(128, 0);
+    rig->settings.qvHpTFcompSelect = 3;
+    const std::vector<float> got = play(*rig, 1);
+    EXPECT_TRUE(hpTFactive);
+    ASSERT_EQ(essError, essErrorNone);
+    ASSERT_NE(hpTFfilter, nullptr);
+    EXPECT_EQ(hpTFfilter[0], 0.9f);
+    expectScaled(got, dry, 0.3f, 0, dry.size());
+    EXPECT_EQ(log.count(LogStream::output, "Buffersize < HpTP_FIR-Filter-Length!!!"), 1u);
+}
+
 TEST_F(EngineHeadphone, LongerBlocksThanTheSpectrumTakeZerosBehindIt) {
     writeFilter("/770ALIF3_CUB_Mono.wav", 0, 1.0f);
     const auto first = built(1024, 3);

@@ -278,6 +278,21 @@ TEST_F(EngineRooms, TailIsHeardThroughTheConvolver) {
     EXPECT_NEAR(10.0 * std::log10(heard / composed), 0.0, 1.5);
 }
 
+TEST_F(EngineRooms, EveryEngineReadsItsTailAnewAndOnce) {
+    writeData(48000, {20});
+    const auto first = built(48000, 512, 20, 20);
+    writeData(48000);  // the same room, silent now
+    const auto second = built(48000, 512, 20, 20);
+    writeFile(directory.file("/TSLdata511.dat"), std::vector<char>{});
+    first->run();
+    second->run();
+    EXPECT_EQ(essError, essErrorNone);
+    EXPECT_EQ(first->state().tail.reverbIR[200], testTailSample(20, 100, 0));
+    EXPECT_EQ(second->state().tail.reverbIR[200], 0.0f);
+    EXPECT_TRUE(sounds(*first, 900, 2000));
+    EXPECT_FALSE(sounds(*second, 900, 2000));
+}
+
 TEST_F(EngineRooms, MissingTailFileSilencesTheProcess) {
     writePackedHrirSet(directory.path(), 48000);
     const auto rig = built(48000, 512, 15, 15);

@@ -4,6 +4,7 @@
 #include <gtest/gtest.h>
 
 #include <array>
+#include <cstdint>
 #include <vector>
 
 #include "base/ess_error.h"
@@ -96,6 +97,45 @@ TEST_F(HeadphoneFilter, AMissingFileIsAnErrorAndAZeroFilter) {
     EXPECT_EQ(essError, essErrorWavUnreadable);
     for (int i = 0; i < 2048; ++i) {
         ASSERT_EQ(hpTFfilter[i], 0.0f);
+    }
+}
+
+TEST_F(HeadphoneFilter, AnUnfitFileIsAnErrorAndAZeroFilter) {
+    const struct {
+        int channels;
+        int frames;
+        int bits;
+        int error;
+    } cases[] = {{2, 256, 32, -107}, {1, 255, 32, -108}, {1, 256, 8, -109}};
+    for (const auto& c : cases) {
+        SCOPED_TRACE(c.error);
+        const TempDirectory directory;
+        std::vector<char> bytes =
+            wavBytes(c.channels, 44100, 32, taps(c.channels * c.frames, 0.1f));
+        bytes[34] = static_cast<char>(c.bits);
+        writeFile(directory.file("/770ALIF3_CUB_Mono.wav"), bytes);
+        essError = essErrorNone;
+        qvHpTFcompSelect = 3;
+        loadHpTF(2048, 1024, directory.path());
+        EXPECT_EQ(essError, c.error);
+        for (int i = 0; i < 2048; ++i) {
+            ASSERT_EQ(hpTFfilter[i], 0.0f) << i;
+        }
+    }
+}
+
+TEST_F(HeadphoneFilter, SelectionsBelowOneSwitchOff) {
+    const TempDirectory directory;
+    writeWav(directory.file("/770ALIF3_CUB_Mono.wav"), 1, 44100, 32, taps(256, 0.001f));
+    engineCount = 1;
+    for (const std::int16_t off : {std::int16_t{0}, std::int16_t{-1}, std::int16_t{-32768}}) {
+        watchHeadphoneSelection(3, 4096, 1024, directory.path());
+        ASSERT_TRUE(hpTFactive);
+        const float* const loaded = hpTFfilter;
+        watchHeadphoneSelection(off, 4096, 1024, directory.path());
+        EXPECT_FALSE(hpTFactive);
+        EXPECT_EQ(qvHpTFcompSelect, off);
+        EXPECT_EQ(hpTFfilter, loaded) << "nothing is loaded for it";
     }
 }
 

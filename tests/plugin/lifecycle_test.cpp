@@ -193,6 +193,60 @@ TEST_F(LifecycleTest, TwoHundredLivesLeaveOnlyTheirLogBuffers) {
     });
 }
 
+TEST_F(LifecycleTest, ThreeHundredRoomChangesKeepNothing) {
+    withData({rate}, [](const PluginLibrary& library) {
+        constexpr int rooms = 53;
+        constexpr std::uint32_t longFrames = 1024;
+        Source source(library, rate, longFrames);
+        EffectInstance reverb(library.effect("Tessaly Reverb"), rate, longFrames);
+        reverb.setParameter("ReverbID", 5.0f);
+        std::vector<float> in(2 * longFrames);
+        std::vector<float> out(2 * longFrames);
+        std::int64_t kept = 0;
+        std::uint64_t allocated = 0;
+        const auto change = [&](int room, bool tail, bool walls) {
+            EffectInstance& effect = source.effect();
+            effect.setParameter("Room Selection", static_cast<float>(room));
+            effect.setParameter("Reverb disable", tail ? 0.0f : 1.0f);
+            effect.setParameter("Auralization", walls ? 1.0f : 0.0f);
+            EXPECT_TRUE(allFinite(source.block()));
+            kept += static_cast<std::int64_t>(effect.blockAllocations()) -
+                    static_cast<std::int64_t>(effect.blockReleases());
+            allocated += effect.blockAllocations();
+        };
+        const auto changeReturn = [&](int room, bool tail) {
+            reverb.setParameter("Room Selection", static_cast<float>(room));
+            reverb.setParameter("Mute", tail ? 0.0f : 1.0f);
+            reverb.processBlock(in.data(), out.data(), longFrames);
+            kept += static_cast<std::int64_t>(reverb.blockAllocations()) -
+                    static_cast<std::int64_t>(reverb.blockReleases());
+        };
+        // Ends in the same rooms each time, so that what is alive then is the same too.
+        const auto changeAll = [&](int changes) {
+            for (int k = 1; k <= changes; ++k) {
+                change(k * 17 % rooms, k % 5 != 0, k % 3 == 0);
+                if (k % 10 == 0) {
+                    changeReturn(k % rooms, k % 20 != 0);
+                }
+            }
+            change(2, true, false);
+            changeReturn(2, true);
+        };
+        const std::string log = standardErrorOf([&] {
+            changeAll(2 * rooms);  // tables of each length are made once for the process
+            kept = 0;
+            changeAll(300);
+        });
+        EXPECT_EQ(occurrences(log, loadLine), 2u * rooms + 10 + 2 + 300 + 30 + 2);
+        EXPECT_EQ(kept, 0);
+        EXPECT_GT(allocated, 300u) << "the counter counts";
+        if (__lsan_do_recoverable_leak_check != nullptr) {
+            EXPECT_EQ(__lsan_do_recoverable_leak_check(), 0);
+        }
+        EXPECT_EQ(library.getErrorState(), 1);
+    });
+}
+
 TEST_F(LifecycleTest, ReverbsComeAndGo) {
     withData({rate}, [](const PluginLibrary& library) {
         std::vector<float> in(2 * frames, 0.5f);

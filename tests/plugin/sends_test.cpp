@@ -172,6 +172,38 @@ TEST_F(SendsTest, SendsPileUpUntilTheReverbRuns) {
     });
 }
 
+TEST_F(SendsTest, SendsPileUpUntilTheReverbLoads) {
+    withData({rate}, [](const PluginLibrary& library) {
+        EffectInstance reverb(library.effect("Tessaly Reverb"), rate, frames);
+        reverb.setParameter("ReverbID", 5.0f);
+        reverb.setParameter("Bypass", 1.0f);
+        Source source(library, rate, frames);
+        setSends(source.effect(), {{5.0f, 0.0f}});
+        source.effect().setParameter("Room Selection", -1.0f);
+        for (int block = 0; block < 4; ++block) {
+            source.block(ones);
+            EXPECT_TRUE(allZero(taken(reverb))) << "without a room there is no engine";
+        }
+        reverb.setParameter("Room Selection", 0.0f);
+        EXPECT_EQ(taken(reverb)[0], 8.0f) << "four blocks at once";
+        EXPECT_TRUE(allZero(taken(reverb)));
+    });
+}
+
+TEST_F(SendsTest, AReverbWithoutAnIdErasesNothing) {
+    withData({rate}, [](const PluginLibrary& library) {
+        const auto reverb = openReverb(library, 5.0f);
+        auto source = std::make_unique<Source>(library, rate, frames);
+        setSends(source->effect(), {{5.0f, 0.0f}});
+        source->effect().setParameter("Room Selection", -1.0f);
+        source->block(ones);
+        openReverb(library, 0.0f).reset();
+        openReverb(library, 0.7f).reset();
+        source.reset();
+        EXPECT_EQ(taken(*reverb)[0], 2.0f) << "neither took the buffer with it";
+    });
+}
+
 TEST_F(SendsTest, TheSecondOfTwoReverbsClearsAndEitherErases) {
     withData({rate}, [](const PluginLibrary& library) {
         const auto first = openReverb(library, 5.0f);
