@@ -3,6 +3,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <numeric>
 
 namespace tessaly {
 
@@ -11,6 +12,7 @@ namespace {
 constexpr float onsetShare = 0.1f;     // of the peak: 20 dB
 constexpr double inaudible = 1e-7;     // of the peak: a response ends where it stays below
 constexpr double largestBias = 0.1;    // share of the end's energy in the curve at the fit's end
+constexpr double leastRoom = 1e-4;     // an octave's energy behind the direct sound re all: -40 dB
 constexpr double leastCycles = 8.0;    // bandwidth times decay time
 constexpr double octaveWidth = 0.707;  // of the centre
 constexpr double energyDecay60 = 13.8155;  // 6 ln 10
@@ -115,16 +117,22 @@ std::array<OctaveDecay, data::decayOctaves> octaveDecays(std::span<const float> 
         return decays;
     }
     // What is left out goes before the filters, which would spread it.
-    const std::vector<double> room(response.begin() + static_cast<std::ptrdiff_t>(start),
-                                   response.begin() + static_cast<std::ptrdiff_t>(end));
+    const std::vector<double> whole(response.begin(),
+                                    response.begin() + static_cast<std::ptrdiff_t>(end));
+    std::array<std::vector<double>, data::decayOctaves> all;
     std::array<std::vector<double>, data::decayOctaves> energies;
-    data::addOctaveEnergies(room, sampleRate, energies);
+    data::addOctaveEnergies(whole, sampleRate, all);
+    data::addOctaveEnergies(std::span(whole).subspan(start), sampleRate, energies);
     for (std::size_t octave = 0; octave < decays.size(); ++octave) {
         OctaveDecay& decay = decays[octave];
         if (decay.hertz * data::lowestInOctave >= 0.5 * sampleRate) {
             continue;
         }
         const Band band = bandOf(std::move(energies[octave]));
+        const double sum = std::accumulate(all[octave].begin(), all[octave].end(), 0.0);
+        if (!(band.toCome.front() >= leastRoom * sum)) {
+            continue;
+        }
         decay.t20 = decayTime(band, decay.hertz, sampleRate, -25.0);
         decay.t30 = decayTime(band, decay.hertz, sampleRate, -35.0);
     }

@@ -26,7 +26,7 @@ std::size_t onsetOf(std::span<const float> response) noexcept;
 std::vector<double> energyDecay(std::span<const float> response);
 
 /// Times for 60 dB; empty where the response does not show them: too little range above what is
-/// left at its end, or shorter than the octave's filter can tell.
+/// left at its end, shorter than the octave's filter can tell, or hardly a room at all.
 struct OctaveDecay {
     double hertz = 0.0;         ///< centre
     std::optional<double> t20;  ///< seconds, from -5 to -25 dB

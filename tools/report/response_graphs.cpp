@@ -49,8 +49,8 @@ float peakOf(const Ears& ears) {
 }
 
 const LineStyle& lineOf(std::size_t ear, bool thin) {
-    static constexpr std::array<LineStyle, 4> styles = {{{.colour = leftColour, .width = 3.6},
-                                                         {.colour = rightColour, .width = 2.0},
+    static constexpr std::array<LineStyle, 4> styles = {{{.colour = leftColour, .width = 3.0},
+                                                         {.colour = rightColour, .width = 1.6},
                                                          {.colour = leftColour, .width = 1.2},
                                                          {.colour = rightColour, .width = 1.2}}};
     return styles[ear + (thin ? 2 : 0)];
@@ -113,12 +113,14 @@ std::string arrivalGraph(const Ears& ears, int sampleRate) {
         curves[ear].style = {.colour = ear == 0 ? leftColour : rightColour, .width = 1.5};
         curves[ear].run = samplesOf(ears[ear], begin, end, milliseconds);
         for (Point& point : curves[ear].run) {
-            point.y = point.y / peak + (ear == 0 ? 1.1 : -1.1);
+            // A square root keeps weak reflections in sight beside the direct sound.
+            point.y = std::copysign(std::sqrt(std::abs(point.y) / peak), point.y) +
+                      (ear == 0 ? 1.1 : -1.1);
         }
     }
     Plot plot;
     plot.title = "Impulse response";
-    plot.unit = "first 80 ms";
+    plot.unit = "first 80 ms, square-root scale";
     plot.kind = "high";
     plot.label = "Impulse response, its first 80 milliseconds." + arrivalWords(ears, sampleRate);
     plot.across = ticksOf(times, 6, "ms");

@@ -14,8 +14,9 @@ namespace tessaly {
 namespace {
 
 constexpr int mostColumns = 720;
-constexpr int rowCount = 208;            // 24 an octave
-constexpr double windowSeconds = 0.085;  // 4096 frames at 48 kHz
+constexpr std::ptrdiff_t hopsPerWindow = 32;  // at most; more would show nothing more
+constexpr int rowCount = 208;                 // 24 an octave
+constexpr double windowSeconds = 0.085;       // 4096 frames at 48 kHz
 constexpr double leastBins = 2.0;
 constexpr double noiseBandwidth = 1.5;  // bins, of the raised cosine
 
@@ -60,7 +61,9 @@ Spectrogram spectrogramOf(std::span<const float> stereo, int ear, int sampleRate
     const double scale = 16.0 / (noiseBandwidth * static_cast<double>(length * length));
 
     Spectrogram result;
-    result.columns = static_cast<int>(std::clamp<std::ptrdiff_t>(frames, 1, mostColumns));
+    const std::ptrdiff_t leastHop = static_cast<std::ptrdiff_t>(length) / hopsPerWindow;
+    result.columns =
+        static_cast<int>(std::clamp<std::ptrdiff_t>(frames / leastHop, 1, mostColumns));
     result.rows = rowCount;
     result.decibels.resize(static_cast<std::size_t>(result.columns) * rowCount);
     std::vector<double> time(length);

@@ -28,7 +28,7 @@ constexpr double quietestSpectrum = -60.0;  // dB; the brightest colour is never
 constexpr int timeTicks = 8;
 
 // Where both ears receive the same, the right one's line lies within the left one's.
-constexpr LineStyle leftLine{.colour = leftColour, .width = 3.2};
+constexpr LineStyle leftLine{.colour = leftColour, .width = 2.8};
 constexpr LineStyle rightLine{.colour = rightColour, .width = 1.6};
 constexpr LineStyle differenceLine{.colour = "var(--ink)", .width = 2.0};
 

@@ -150,7 +150,7 @@ TEST(ReportPage, WhateverComesIsAPage) {
         std::vector<float>(2 * 100, std::numeric_limits<float>::max()),
         std::vector<float>(2 * 100, std::numeric_limits<float>::denorm_min())};
     for (std::size_t i = 0; i < sounds.size(); ++i) {
-        for (const std::size_t step : {0u, 1u, 3u}) {
+        for (const std::size_t step : {0u, 3u}) {
             const std::vector<float>& sound = sounds[i];
             const std::vector<float>& ear = sounds[(i + step) % sounds.size()];
             Report report = smallReport();

@@ -34,8 +34,8 @@ int loudestRow(const Spectrogram& spectrogram, int column) {
 }
 
 TEST(Spectrogram, SinesAreAtTheirFrequencyAndLevel) {
-    for (const int rate : {24000, 44100, 48000}) {
-        for (const double hertz : {100.0, 440.0, 1000.0, 5000.0, 11000.0}) {
+    for (const int rate : {24000, 48000}) {
+        for (const double hertz : {100.0, 1000.0, 11000.0}) {
             SCOPED_TRACE(testing::Message() << rate << " " << hertz);
             const Spectrogram left = spectrogramOf(sine(hertz, 0.5, 0.3, rate), 0, rate);
             const int row = loudestRow(left, left.columns / 2);
