@@ -44,8 +44,9 @@ template <typename Draw>
 void forEachTick(const AxisRange& range, double step, const Draw& draw) {
     const double first = std::ceil(range.low / step - 1e-9);
     const double last = std::floor(range.high / step + 1e-9);
-    for (double index = first; index <= last; index += 1.0) {
-        draw(index * step);
+    const int count = static_cast<int>(last - first) + 1;
+    for (int i = 0; i < count; ++i) {
+        draw((first + i) * step);
     }
 }
 

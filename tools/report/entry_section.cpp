@@ -44,7 +44,7 @@ std::string playerMarkup(const ReportEntry& entry, const SoundData& sound) {
 }
 
 std::string factsMarkup(const ReportEntry& entry, const std::vector<float>& stereo) {
-    const double seconds = static_cast<double>(stereo.size() / 2) / entry.sampleRate;
+    const double seconds = secondsOf(stereo, entry.sampleRate);
     return fmt::format(
         "<dl class=\"facts\"><div><dt>Length</dt><dd>{} s</dd></div>"
         "<div><dt>Rate</dt><dd>{} Hz</dd></div>"
@@ -119,7 +119,7 @@ std::string entrySection(const ReportEntry& entry, std::size_t index) {
     }
     markup += playerMarkup(entry, sound) + remarksMarkup(remarks);
     if (!sound.flac.empty()) {
-        const double duration = static_cast<double>(clean.stereo.size() / 2) / entry.sampleRate;
+        const double duration = secondsOf(clean.stereo, entry.sampleRate);
         markup += factsMarkup(entry, clean.stereo) + "<div class=\"overview\">\n" +
                   topViewMarkup(entry, duration) + "<div class=\"stack\">\n" +
                   binauralGraphs(clean.stereo, entry.sampleRate) + "</div>\n</div>\n" +

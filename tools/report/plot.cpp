@@ -18,7 +18,7 @@ constexpr double drawingHeight = 400.0;
 constexpr std::size_t fewTicks = 6;
 
 // The hyphen of a formatted number becomes a minus sign.
-std::string withMinus(std::string number) {
+std::string withMinus(const std::string& number) {
     return number.starts_with('-') ? "\xE2\x88\x92" + number.substr(1) : number;
 }
 

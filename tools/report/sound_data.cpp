@@ -84,6 +84,11 @@ CleanSound cleaned(std::span<const float> stereo) {
     return sound;
 }
 
+double secondsOf(std::span<const float> stereo, int sampleRate) noexcept {
+    const std::size_t frames = stereo.size() / 2;
+    return static_cast<double>(frames) / sampleRate;
+}
+
 SoundData encodeFlac(std::span<const float> stereo, int sampleRate) {
     SoundData data;
     if (stereo.size() < 2) {

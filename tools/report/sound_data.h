@@ -14,6 +14,9 @@ struct CleanSound {
 };
 CleanSound cleaned(std::span<const float> stereo);
 
+/// Length of interleaved stereo samples in seconds.
+double secondsOf(std::span<const float> stereo, int sampleRate) noexcept;
+
 /// FLAC, 16 bit. 0 frames give an empty file.
 struct SoundData {
     std::vector<unsigned char> flac;

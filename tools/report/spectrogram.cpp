@@ -52,8 +52,8 @@ float decibelsOf(double power) {
 
 Spectrogram spectrogramOf(std::span<const float> stereo, int ear, int sampleRate) {
     const auto frames = static_cast<std::ptrdiff_t>(stereo.size() / 2);
-    const std::size_t length =
-        data::nextPowerOfTwo(static_cast<std::size_t>(windowSeconds * sampleRate));
+    const std::size_t length = data::nextPowerOfTwo(
+        std::max<std::size_t>(4, static_cast<std::size_t>(windowSeconds * sampleRate)));
     data::RealTransform& transform = data::threadTransform(length);
     const std::vector<double> window = windowOf(length);
     const double binHertz = sampleRate / static_cast<double>(length);
@@ -61,7 +61,8 @@ Spectrogram spectrogramOf(std::span<const float> stereo, int ear, int sampleRate
     const double scale = 16.0 / (noiseBandwidth * static_cast<double>(length * length));
 
     Spectrogram result;
-    const std::ptrdiff_t leastHop = static_cast<std::ptrdiff_t>(length) / hopsPerWindow;
+    const auto leastHop =
+        std::max<std::ptrdiff_t>(1, static_cast<std::ptrdiff_t>(length) / hopsPerWindow);
     result.columns =
         static_cast<int>(std::clamp<std::ptrdiff_t>(frames / leastHop, 1, mostColumns));
     result.rows = rowCount;

@@ -14,6 +14,7 @@
 #include "render/binaural_measures.h"
 #include "report/base64.h"
 #include "report/plot.h"
+#include "report/sound_data.h"
 #include "report/spectrogram.h"
 
 namespace tessaly {
@@ -126,6 +127,7 @@ std::vector<Tick> frequencyTicks() {
                                                                       {10000.0, "10 k"},
                                                                       {20000.0, "20 k"}}};
     std::vector<Tick> ticks;
+    ticks.reserve(marks.size());
     for (const auto& [hertz, label] : marks) {
         ticks.push_back(
             {std::log(hertz / lowestShownHertz) / std::log(highestShownHertz / lowestShownHertz),
@@ -140,10 +142,10 @@ std::string strongestWords(const Spectrogram& spectrogram, double duration) {
         return "It is silent.";
     }
     const auto place = loudest - spectrogram.decibels.begin();
-    const double seconds =
-        (static_cast<double>(place % spectrogram.columns) + 0.5) * duration / spectrogram.columns;
-    const double height =
-        1.0 - (static_cast<double>(place / spectrogram.columns) + 0.5) / spectrogram.rows;
+    const auto row = static_cast<int>(place / spectrogram.columns);
+    const auto column = static_cast<int>(place % spectrogram.columns);
+    const double seconds = (column + 0.5) * duration / spectrogram.columns;
+    const double height = 1.0 - (row + 0.5) / spectrogram.rows;
     const double hertz = lowestShownHertz * std::pow(highestShownHertz / lowestShownHertz, height);
     return fmt::format("It is strongest near {:.2g} kilohertz at {} seconds, {} dB.",
                        hertz / 1000.0, shownNumber(seconds, 1),
@@ -153,7 +155,7 @@ std::string strongestWords(const Spectrogram& spectrogram, double duration) {
 }  // namespace
 
 std::string binauralGraphs(std::span<const float> stereo, int sampleRate) {
-    const double duration = static_cast<double>(stereo.size() / 2) / sampleRate;
+    const double duration = secondsOf(stereo, sampleRate);
     const double hop = std::max(finestHop, duration / mostPoints);
     const std::vector<BinauralPoint> points =
         measureBinaural(stereo, static_cast<double>(sampleRate), hop);
@@ -196,7 +198,7 @@ std::string binauralGraphs(std::span<const float> stereo, int sampleRate) {
 }
 
 std::string spectrumGraphs(std::span<const float> stereo, int sampleRate) {
-    const double duration = static_cast<double>(stereo.size() / 2) / sampleRate;
+    const double duration = secondsOf(stereo, sampleRate);
     const std::array<Spectrogram, 2> ears = {spectrogramOf(stereo, 0, sampleRate),
                                              spectrogramOf(stereo, 1, sampleRate)};
     const double loudest = std::max(loudestOf(ears[0]), loudestOf(ears[1]));
