@@ -1,4 +1,5 @@
-// Every example scene renders whole: heard, below full scale, without allocations, twice the same.
+// Every example scene renders whole: heard, below full scale, without allocations, and its first
+// seconds a second time the same.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -43,9 +44,19 @@ std::vector<Example> examples() {
     return all;
 }
 
-SceneResult renderedWithACopy(const Example& example) {
+constexpr std::size_t framesCompared = 96000;
+
+SceneResult renderedWithACopy(const Example& example, const SceneInputs& inputs) {
     const PluginLibrary library = PluginLibrary::privateCopy(TESSALY_LIBRARY);
-    return renderScene(library, TESSALY_TEST_DATA, example.scene, example.inputs, [](double) {});
+    return renderScene(library, TESSALY_TEST_DATA, example.scene, inputs, [](double) {});
+}
+
+// The same scene, left early: paths keep their time.
+SceneInputs beginning(const SceneInputs& inputs) {
+    SceneInputs result = inputs;
+    result.frames = std::min(result.frames, framesCompared);
+    result.tailFrames = 0;
+    return result;
 }
 
 class Examples : public SceneRender {};
@@ -60,7 +71,11 @@ TEST_F(Examples, EachIsHeardAndStaysBelowFullScale) {
     }
     data::forEachParallel(2 * all.size(), [&](std::size_t i) {
         Example& example = all[i / 2];
-        (i % 2 == 0 ? example.first : example.second) = renderedWithACopy(example);
+        if (i % 2 == 0) {
+            example.first = renderedWithACopy(example, example.inputs);
+        } else {
+            example.second = renderedWithACopy(example, beginning(example.inputs));
+        }
     });
     for (const Example& example : all) {
         SCOPED_TRACE(example.file.filename());
@@ -69,7 +84,10 @@ TEST_F(Examples, EachIsHeardAndStaysBelowFullScale) {
         EXPECT_LT(peak, 1.0f);
         EXPECT_TRUE(example.first.warnings.empty()) << example.first.warnings.front();
         EXPECT_EQ(example.first.allocations + example.first.releases, 0u);
-        EXPECT_EQ(example.first.stereo, example.second.stereo);
+        ASSERT_GT(largest(example.second.stereo), 0.0f);
+        ASSERT_LE(example.second.stereo.size(), example.first.stereo.size());
+        EXPECT_TRUE(std::equal(example.second.stereo.begin(), example.second.stereo.end(),
+                               example.first.stereo.begin()));
         for (const std::vector<float>& output : example.first.returnOutputs) {
             EXPECT_GT(largest(output), 1e-3f) << "a return that nobody hears";
         }
