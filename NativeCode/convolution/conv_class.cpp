@@ -67,6 +67,14 @@ void carveSpectra(std::vector<ComplexBin*>& entries, ComplexBin*& memory, std::i
     }
 }
 
+/// y += x * gain, bin by bin.
+void addScaled(std::size_t bins, const ComplexBin* x, float gain, ComplexBin* y) noexcept {
+    for (std::size_t i = 0; i < bins; ++i) {
+        y[i].re += x[i].re * gain;
+        y[i].im += x[i].im * gain;
+    }
+}
+
 void carveTimeParts(std::vector<float*>& entries, AlignedArray<float>& memory, std::size_t length) {
     memory = AlignedArray<float>(entries.size() * length);
     for (std::size_t i = 0; i < entries.size(); ++i) {
@@ -175,6 +183,17 @@ convClass::convClass(std::string instanceNameIn,
     }
     allocSpectrum(accumL, binCount);
     allocSpectrum(accumR, binCount);
+    if (isSecondInstance == 0) {
+        for (ComplexBin** const spectrum : {&partL_, &partR_, &endL_, &endR_}) {
+            allocSpectrum(*spectrum, binCount);
+        }
+    }
+    scaled_.begin = count;
+    changed_.resize(count);
+    silent_.resize(count);
+    chosenRing_.resize(count);
+    chosenLeft_.resize(count);
+    chosenRight_.resize(count);
 
     dftiStatus = createFFT(fftHandle, fftLength);
     dftiStatus = createFFT(ifftHandle, fftLength);
@@ -199,6 +218,11 @@ convClass::~convClass() {
     }
     freeSpectrum(accumL);
     freeSpectrum(accumR);
+    if (isSecondInstance == 0) {
+        for (ComplexBin** const spectrum : {&partL_, &partR_, &endL_, &endR_}) {
+            freeSpectrum(*spectrum);
+        }
+    }
 }
 
 void convClass::clearFDL() noexcept {
@@ -295,8 +319,8 @@ void convClass::updateFilter() noexcept {
         if (FDLtoBUFConv != 1 && hpTFactive) {
             fullLengthBranch();
         }
-        transformPartitions(firL, timePartsL, filterPartsL);
-        transformPartitions(firR, timePartsR, filterPartsR);
+        findChangedPartitions();
+        transformChanged();
     }
     if (hpTFactive && FDLtoBUFConv == 1) {
         multiplyHeadphone(filterPartsL[0], hpTFspectrumL, binCount);
@@ -318,21 +342,67 @@ void convClass::feedDirectly(float* fir,
 
 /// A partition whose samples are bit for bit those last transformed keeps its spectrum: a source
 /// that stands still asks for an update in every block.
-void convClass::transformPartitions(const float* fir,
-                                    const std::vector<float*>& timeParts,
-                                    const std::vector<ComplexBin*>& filterParts) noexcept {
+void convClass::findChangedPartitions() noexcept {
+    std::fill(changed_.begin(), changed_.end(), std::uint8_t{0});
+    changedCount_ = 0;
     const auto length = static_cast<std::size_t>(blockLength);
+    std::size_t first = 0;
+    std::size_t end = changed_.size();
+    if (notes_ != nullptr) {
+        FirStretch& written = notes_->written;
+        if (written.empty()) {
+            return;
+        }
+        first = static_cast<std::size_t>(std::max(written.begin, 0)) / length;
+        end = std::min(end, (static_cast<std::size_t>(written.end) + length - 1) / length);
+        written.clear();
+    }
+    const ScaledPartitions next = scaledNow();
     const auto available = static_cast<std::size_t>(std::max(firBufferSize, 0));
-    for (std::size_t i = 0; i < timeParts.size(); ++i) {
+    const std::size_t bytes = length * sizeof(float);
+    for (std::size_t i = first; i < end; ++i) {
         const std::size_t start = i * length;
-        if (fir == nullptr || start + length > available) {
+        if (start + length > available) {
             break;
         }
-        const std::size_t bytes = length * sizeof(float);
-        const bool known = std::memcmp(timeParts[i], fir + start, bytes) == 0;
-        if (!known || fftHandle == nullptr) {
-            std::memcpy(timeParts[i], fir + start, bytes);
-            dftiStatus = FFT(timeParts[i], filterParts[i], fftHandle);
+        const bool known =
+            (firL == nullptr || std::memcmp(timePartsL[i], firL + start, bytes) == 0) &&
+            (firR == nullptr || std::memcmp(timePartsR[i], firR + start, bytes) == 0);
+        // One that joins or leaves the scaled end counts differently even with equal samples.
+        if (!known || fftHandle == nullptr || (i < scaled_.begin) != (i < next.begin)) {
+            changed_[i] = 1;
+            ++changedCount_;
+        }
+    }
+}
+
+convClass::ScaledPartitions convClass::scaledNow() const noexcept {
+    const std::size_t all = filterPartsL.size();
+    if (notes_ == nullptr || blockLength <= 0) {
+        return {all, 1.0f};
+    }
+    const ScaledEnd& end = notes_->scaledEnd;
+    const auto begin = static_cast<std::size_t>(std::max(end.begin, 0) / blockLength);
+    return {std::min(begin, all), end.gain};
+}
+
+void convClass::transformChanged() noexcept {
+    scaled_ = scaledNow();
+    const auto length = static_cast<std::size_t>(blockLength);
+    const auto take = [&](const float* fir, float* samples, ComplexBin* spectrum,
+                          std::size_t start) noexcept {
+        if (fir == nullptr) {
+            return false;
+        }
+        std::memcpy(samples, fir + start, length * sizeof(float));
+        dftiStatus = FFT(samples, spectrum, fftHandle);
+        return std::all_of(samples, samples + length, [](float x) { return x == 0.0f; });
+    };
+    for (std::size_t i = 0; i < changed_.size(); ++i) {
+        if (changed_[i] != 0) {
+            const bool leftSilent = take(firL, timePartsL[i], filterPartsL[i], i * length);
+            const bool rightSilent = take(firR, timePartsR[i], filterPartsR[i], i * length);
+            silent_[i] = leftSilent && rightSilent && dftiStatus == transformOk ? 1 : 0;
         }
     }
 }
@@ -372,7 +442,8 @@ void convClass::accumulate() noexcept {
     const ComplexBin* const* const left = compensated ? &hpTFspectrumL : filterPartsL.data();
     const ComplexBin* const* const right = compensated ? &hpTFspectrumR : filterPartsR.data();
     const auto partitions = static_cast<std::size_t>(FDLtoBUFConv);
-    bool complete = accumL != nullptr && accumR != nullptr;
+    bool complete =
+        accumL != nullptr && accumR != nullptr && (isSecondInstance != 0 || hasSumMemory());
     for (std::size_t i = 0; i < partitions; ++i) {
         complete = complete && FDL[i] != nullptr && left[i] != nullptr && right[i] != nullptr;
     }
@@ -381,8 +452,159 @@ void convClass::accumulate() noexcept {
         clearSpectrum(accumR, binCount - 1);
         return;
     }
-    kernels_->ringSum(static_cast<std::size_t>(binCount), partitions, newestSlot(), FDL.data(),
-                      left, right, accumL, accumR);
+    if (compensated || isSecondInstance != 0) {
+        kernels_->ringSum(static_cast<std::size_t>(binCount), partitions, newestSlot(), FDL.data(),
+                          left, right, accumL, accumR);
+        return;
+    }
+    accumulateFrom(*this);
+}
+
+bool convClass::hasSumMemory() const noexcept {
+    return partL_ != nullptr && partR_ != nullptr && endL_ != nullptr && endR_ != nullptr;
+}
+
+void convClass::accumulateFrom(const convClass& ring) noexcept {
+    clearSpectrum(accumL, binCount - 1);
+    clearSpectrum(accumR, binCount - 1);
+    addSums(
+        ring, [](std::size_t) { return true; }, scaled_, accumL, accumR);
+}
+
+/// Sum over chosen partitions of this instance's spectra with the ring of any. Partitions that are
+/// known to be zero are left out. @return false, and nothing written, if none is left
+template <typename Choice>
+bool convClass::sumOver(const convClass& ring,
+                        Choice&& chosen,
+                        ComplexBin* sumL,
+                        ComplexBin* sumR) noexcept {
+    const auto partitions = static_cast<std::size_t>(FDLtoBUFConv);
+    const std::size_t newest = ring.newestSlot();
+    std::size_t count = 0;
+    for (std::size_t i = 0; i < partitions; ++i) {
+        if (silent_[i] == 0 && chosen(i)) {
+            // Partition i meets the input of i blocks ago.
+            chosenRing_[count] = ring.FDL[(newest + partitions - i) % partitions];
+            chosenLeft_[count] = filterPartsL[i];
+            chosenRight_[count] = filterPartsR[i];
+            ++count;
+        }
+    }
+    if (count == 0) {
+        return false;
+    }
+    // The kernel pairs slot k of a ring with partition count - k.
+    std::reverse(chosenRing_.begin() + 1, chosenRing_.begin() + static_cast<std::ptrdiff_t>(count));
+    kernels_->ringSum(static_cast<std::size_t>(binCount), count, 0, chosenRing_.data(),
+                      chosenLeft_.data(), chosenRight_.data(), sumL, sumR);
+    return true;
+}
+
+/// Adds the chosen partitions, those of the scaled end with its gain.
+template <typename Choice>
+void convClass::addSums(const convClass& ring,
+                        Choice&& chosen,
+                        const ScaledPartitions& scaled,
+                        ComplexBin* sumL,
+                        ComplexBin* sumR) noexcept {
+    const auto bins = static_cast<std::size_t>(binCount);
+    const std::size_t begin = scaled.begin;
+    if (sumOver(
+            ring, [&](std::size_t i) { return i < begin && chosen(i); }, partL_, partR_)) {
+        kernels_->add(bins, sumL, partL_, sumL);
+        kernels_->add(bins, sumR, partR_, sumR);
+    }
+    if (sumOver(
+            ring, [&](std::size_t i) { return i >= begin && chosen(i); }, partL_, partR_)) {
+        addScaled(bins, partL_, scaled.gain, sumL);
+        addScaled(bins, partR_, scaled.gain, sumR);
+    }
+}
+
+/// The plain order of a crossfade block, for all cases that the shared sum does not cover.
+void convClass::borrowAndProcess(convClass& second) noexcept {
+    second.process();
+    std::copy(second.FDL.begin(), second.FDL.end(), FDL.begin());
+    process();
+    std::copy(FDLown.begin(), FDLown.end(), FDL.begin());
+}
+
+bool convClass::sharesWith(const convClass& second) const noexcept {
+    if (hpTFactive && FDLtoBUFConv == 1) {
+        return false;
+    }
+    bool shares = directFilterFeed == 0 && isSecondInstance == 0 && second.isSecondInstance != 0 &&
+                  second.FDLtoBUFConv == FDLtoBUFConv && second.binCount == binCount &&
+                  second.newestSlot() == newestSlot() && fftHandle != nullptr &&
+                  second.fftHandle != nullptr && accumL != nullptr && accumR != nullptr &&
+                  second.accumL != nullptr && second.accumR != nullptr && hasSumMemory();
+    for (std::size_t i = 0; shares && i < FDL.size(); ++i) {
+        shares = second.FDL[i] != nullptr && filterPartsL[i] != nullptr &&
+                 filterPartsR[i] != nullptr && second.filterPartsL[i] == filterPartsL[i] &&
+                 second.filterPartsR[i] == filterPartsR[i];
+    }
+    return shares;
+}
+
+void convClass::processCrossfade(convClass& second, std::int32_t heardOfOld) noexcept {
+    if (!sharesWith(second)) {
+        borrowAndProcess(second);
+        return;
+    }
+    second.watchSelection();
+    second.dftiStatus = FFT(second.input, second.FDL[newestSlot()], second.fftHandle);
+    watchSelection();
+    const bool update = filterChangeAll || forceUpdateAll;
+    if (update && hpTFactive) {
+        fullLengthBranch();
+    }
+    changedCount_ = 0;
+    const ScaledPartitions before = scaled_;
+    if (update) {
+        findChangedPartitions();
+        scaled_ = scaledNow();
+    }
+    const bool sameLevel = before.begin == scaled_.begin && before.gain == scaled_.gain;
+    if (changedCount_ == 0 && sameLevel) {
+        accumulateFrom(second);
+        dftiStatus = IFFT(accumL, outputL, ifftHandle);
+        dftiStatus = IFFT(accumR, outputR, ifftHandle);
+        const std::int32_t heard = std::clamp(heardOfOld, 0, blockLength);
+        std::copy_n(outputL + blockLength, heard, second.outputL + blockLength);
+        std::copy_n(outputR + blockLength, heard, second.outputR + blockLength);
+        return;
+    }
+
+    // What both responses share: untouched partitions, and the end without its gain.
+    const std::size_t lastBegin = std::max(before.begin, scaled_.begin);
+    const auto touched = [this](std::size_t i) { return changed_[i] != 0; };
+    const auto near = [&](std::size_t i) { return changed_[i] == 0 && i < lastBegin; };
+    const auto end = [&](std::size_t i) { return changed_[i] == 0 && i >= lastBegin; };
+    if (!sumOver(second, near, accumL, accumR)) {
+        clearSpectrum(accumL, binCount - 1);
+        clearSpectrum(accumR, binCount - 1);
+    }
+    const bool hasEnd = sumOver(second, end, endL_, endR_);
+    const auto addEnd = [&](float gain, ComplexBin* sumL, ComplexBin* sumR) {
+        if (hasEnd) {
+            addScaled(static_cast<std::size_t>(binCount), endL_, gain, sumL);
+            addScaled(static_cast<std::size_t>(binCount), endR_, gain, sumR);
+        }
+    };
+
+    const auto bins = static_cast<std::size_t>(binCount);
+    std::copy_n(accumL, bins, second.accumL);
+    std::copy_n(accumR, bins, second.accumR);
+    addSums(second, touched, before, second.accumL, second.accumR);
+    addEnd(before.gain, second.accumL, second.accumR);
+    second.dftiStatus = IFFT(second.accumL, second.outputL, second.ifftHandle);
+    second.dftiStatus = IFFT(second.accumR, second.outputR, second.ifftHandle);
+
+    transformChanged();
+    addSums(second, touched, scaled_, accumL, accumR);
+    addEnd(scaled_.gain, accumL, accumR);
+    dftiStatus = IFFT(accumL, outputL, ifftHandle);
+    dftiStatus = IFFT(accumR, outputR, ifftHandle);
 }
 
 }  // namespace tessaly

@@ -6,6 +6,7 @@
 #include <vector>
 
 #include "base/aligned_array.h"
+#include "convolution/fir_notes.h"
 #include "convolution/spectral_primitives.h"
 
 namespace tessaly {
@@ -88,6 +89,18 @@ public:
     /// @return `outputL`
     float* process() noexcept;
 
+    /// One crossfade block of the first instance and its second: the second takes the input into
+    /// its ring and renders with the spectra as they stand, then this one updates them and renders
+    /// the same ring; its own ring stays as it is, newest slot included. The sum over partitions
+    /// that no update touches is made once for both; without any, the second's result is a copy of
+    /// this one's. Of the second's block only the first `heardOfOld` samples are promised. Block
+    /// time.
+    void processCrossfade(convClass& second, std::int32_t heardOfOld) noexcept;
+
+    /// Who writes the responses tells here which samples, taken and cleared by each update, and
+    /// whether their end has a gain. Null: all of them may have changed. Load time.
+    void watch(FirNotes* notes) noexcept { notes_ = notes; }
+
     /// Zeroes every spectrum in `FDL`. Block time.
     void clearFDL() noexcept;
 
@@ -160,14 +173,47 @@ private:
     void feedDirectly(float* fir,
                       std::vector<float*>& timeParts,
                       const std::vector<ComplexBin*>& filterParts) noexcept;
-    void transformPartitions(const float* fir,
-                             const std::vector<float*>& timeParts,
-                             const std::vector<ComplexBin*>& filterParts) noexcept;
     void fullLengthBranch() noexcept;
     static void multiplyHeadphone(const ComplexBin* filter,
                                   ComplexBin* product,
                                   std::int32_t bins) noexcept;
     void accumulate() noexcept;
+    void borrowAndProcess(convClass& second) noexcept;
+    bool sharesWith(const convClass& second) const noexcept;
+    void findChangedPartitions() noexcept;
+    void transformChanged() noexcept;
+    /// How the end of the response counts: partitions from `begin` on, `gain` times.
+    struct ScaledPartitions {
+        std::size_t begin = 0;
+        float gain = 1.0f;
+    };
+    ScaledPartitions scaledNow() const noexcept;
+    void accumulateFrom(const convClass& ring) noexcept;
+    bool hasSumMemory() const noexcept;
+    template <typename Choice>
+    bool sumOver(const convClass& ring,
+                 Choice&& chosen,
+                 ComplexBin* sumL,
+                 ComplexBin* sumR) noexcept;
+    template <typename Choice>
+    void addSums(const convClass& ring,
+                 Choice&& chosen,
+                 const ScaledPartitions& scaled,
+                 ComplexBin* sumL,
+                 ComplexBin* sumR) noexcept;
+
+    FirNotes* notes_ = nullptr;
+    ScaledPartitions scaled_;            ///< of the spectra as they stand
+    std::vector<std::uint8_t> changed_;  ///< per partition: its samples are not those transformed
+    std::int32_t changedCount_ = 0;
+    std::vector<std::uint8_t> silent_;  ///< per partition: both spectra are known to be zero
+    std::vector<const ComplexBin*> chosenRing_;
+    std::vector<const ComplexBin*> chosenLeft_;
+    std::vector<const ComplexBin*> chosenRight_;
+    ComplexBin* partL_ = nullptr;  ///< sums over a part of the partitions
+    ComplexBin* partR_ = nullptr;
+    ComplexBin* endL_ = nullptr;  ///< likewise, over the scaled end
+    ComplexBin* endR_ = nullptr;
 
     /// One block of memory for each array above; the stride between two spectra is whole cache
     /// lines and no multiple of 4 KB, so that neighbours do not share cache sets.

@@ -60,7 +60,11 @@ struct ConvolverRig {
         if (second != nullptr) {
             second->FDLpos = first->FDLpos;
         }
-        if (second != nullptr && update && blockCounter != 0) {
+        if (second != nullptr && update && blockCounter != 0 && heardOfOld >= 0) {
+            secondOLSactive = true;
+            first->processCrossfade(*second, heardOfOld);
+            secondOLSactive = false;
+        } else if (second != nullptr && update && blockCounter != 0) {
             secondOLSactive = true;
             second->process();
             for (std::size_t i = 0; i < first->FDL.size(); ++i) {
@@ -110,6 +114,9 @@ struct ConvolverRig {
     float* hpTFfilter = nullptr;
     std::int16_t hpTFselect = 0;
     std::uint32_t blockCounter = 0;
+    /// From 0 on crossfade blocks run in one call that promises so many samples of the old
+    /// response; below they run in the plain order.
+    std::int32_t heardOfOld = -1;
     std::unique_ptr<convClass> first;
     std::unique_ptr<convClass> second;
 };

@@ -1,0 +1,211 @@
+// What is spared where little changes, against the plain order that computes all of it.
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cmath>
+#include <cstring>
+
+#include "convolution/convolver_rig.h"
+#include "convolution/kernel_fixture.h"
+
+namespace tessaly::test {
+namespace {
+
+constexpr std::int32_t heard = 16;
+
+struct Shape {
+    std::int32_t blockLength;
+    std::int16_t partitions;
+};
+
+bool sameSpectra(const std::vector<ComplexBin*>& a,
+                 const std::vector<ComplexBin*>& b,
+                 std::int32_t bins) {
+    for (std::size_t i = 0; i < a.size(); ++i) {
+        if (std::memcmp(a[i], b[i], static_cast<std::size_t>(bins) * sizeof(ComplexBin)) != 0) {
+            return false;
+        }
+    }
+    return true;
+}
+
+/// Two pairs of convolvers on the same input: one in the plain order with the whole response
+/// written out, one that is told what changes and has the end of its response without its gain.
+class ChangingResponse : public testing::TestWithParam<Shape> {
+protected:
+    ChangingResponse()
+        : plain(GetParam().blockLength, GetParam().partitions),
+          spared(GetParam().blockLength, GetParam().partitions) {
+        resetConvolutionState();
+        plain.makeBoth();
+        spared.makeBoth();
+        spared.heardOfOld = heard;
+        spared.first->watch(&notes);
+        const int size = static_cast<int>(spared.filterLeft.size());
+        notes.scaledEnd = {size, 1.0f};
+        notes.written.include(0, size);
+    }
+    ~ChangingResponse() override { resetConvolutionState(); }
+    ChangingResponse(const ChangingResponse&) = delete;
+    ChangingResponse& operator=(const ChangingResponse&) = delete;
+
+    int block() const { return spared.blockLength; }
+    int size() const { return static_cast<int>(spared.filterLeft.size()); }
+
+    /// Writes noise, or silence, into [begin, end) of the response that is spared.
+    void write(int begin, int end, float level) {
+        for (int i = begin; i < end; ++i) {
+            spared.filterLeft[static_cast<std::size_t>(i)] = level * noise();
+            spared.filterRight[static_cast<std::size_t>(i)] = level * noise();
+        }
+        notes.written.include(begin, end);
+    }
+    void setEnd(int begin, float gain) {
+        // What stood between the two places is read differently now.
+        notes.written.include(std::min(begin, notes.scaledEnd.begin),
+                              std::max(begin, notes.scaledEnd.begin));
+        notes.scaledEnd = {begin, gain};
+    }
+    /// Writes the same response out for the plain pair.
+    void writeOut() {
+        for (int i = 0; i < size(); ++i) {
+            const auto at = static_cast<std::size_t>(i);
+            const float gain = i >= notes.scaledEnd.begin ? notes.scaledEnd.gain : 1.0f;
+            plain.filterLeft[at] = spared.filterLeft[at] * gain;
+            plain.filterRight[at] = spared.filterRight[at] * gain;
+        }
+    }
+    void run(bool update) {
+        if (update) {
+            writeOut();
+        }
+        const std::vector<float> input = silent
+                                             ? std::vector<float>(static_cast<std::size_t>(block()))
+                                             : noise.samples(static_cast<std::size_t>(block()));
+        plain.feed(input);
+        spared.feed(input);
+        const bool crossfade = update && plain.blockCounter != 0;
+        plain.run(update);
+        spared.run(update);
+        compare(plain.firstLeft, spared.firstLeft, block());
+        compare(plain.firstRight, spared.firstRight, block());
+        if (crossfade) {
+            compare(plain.secondLeft, spared.secondLeft, heard);
+            compare(plain.secondRight, spared.secondRight, heard);
+        }
+        const std::int32_t bins = spared.first->binCount;
+        EXPECT_TRUE(sameSpectra(plain.first->FDLown, spared.first->FDLown, bins));
+        EXPECT_TRUE(sameSpectra(plain.second->FDL, spared.second->FDL, bins));
+        EXPECT_EQ(spared.first->FDL, spared.first->FDLown);
+        EXPECT_EQ(plain.first->FDLpos, spared.first->FDLpos);
+        EXPECT_TRUE(!update || notes.written.empty()) << "an update takes what was written";
+    }
+    /// The heard half of a result, or its start.
+    void compare(const std::vector<float>& expected, const std::vector<float>& got, int count) {
+        for (int i = 0; i < count; ++i) {
+            const auto at = static_cast<std::size_t>(block() + i);
+            largest = std::max(largest, std::abs(static_cast<double>(expected[at])));
+            worst = std::max(
+                worst, std::abs(static_cast<double>(expected[at]) - static_cast<double>(got[at])));
+        }
+    }
+
+    ConvolverRig plain;
+    ConvolverRig spared;
+    FirNotes notes;
+    Noise noise{11};
+    bool silent = false;
+    double largest = 0.0;
+    double worst = 0.0;
+};
+
+TEST_P(ChangingResponse, FollowsThePlainOrderThroughEveryKindOfChange) {
+    write(0, size(), 0.5f);
+    for (int n = 0; n < 160; ++n) {
+        SCOPED_TRACE(n);
+        const int kind = static_cast<int>(noise.samples(1)[0] * 1000.0f + 1000.0f) % 10;
+        const auto place = [&](int least, int most) {
+            const int span = std::max(most - least, 0);
+            return least + static_cast<int>((noise() + 1.0f) * 0.5f * static_cast<float>(span));
+        };
+        switch (kind) {
+            case 0:  // a single sample
+            case 1: {
+                const int at = place(0, size() - 1);
+                write(at, at + 1, 0.5f);
+                break;
+            }
+            case 2: {
+                const int begin = place(0, size());
+                write(begin, place(begin, size()), 0.5f);
+                break;
+            }
+            case 3: {  // silence in whole partitions
+                const int begin = place(0, size() / block()) * block();
+                write(begin, std::min(begin + 2 * block(), size()), 0.0f);
+                break;
+            }
+            case 4:
+                setEnd(place(0, GetParam().partitions) * block(), 0.25f + 0.25f * noise());
+                break;
+            case 5:
+                setEnd(notes.scaledEnd.begin, noise());
+                break;
+            case 6:
+                setEnd(size(), 1.0f);
+                break;
+            case 7:
+                setEnd(notes.scaledEnd.begin, 0.0f);
+                break;
+            case 8:
+                silent = !silent;
+                break;
+            default:  // nothing
+                break;
+        }
+        const bool update = n == 0 || static_cast<int>(noise() * 10.0f) % 4 != 0;
+        run(update);
+    }
+    ASSERT_GT(largest, 0.0);
+    EXPECT_LT(worst / largest, 1e-6);
+}
+
+TEST_P(ChangingResponse, AnUnchangedResponseGivesTheOldOnesSamplesBitForBit) {
+    write(0, size(), 0.5f);
+    run(true);
+    for (int n = 0; n < 3 * GetParam().partitions; ++n) {
+        run(true);
+        for (int i = 0; i < heard; ++i) {
+            const auto at = static_cast<std::size_t>(block() + i);
+            ASSERT_EQ(spared.firstLeft[at], spared.secondLeft[at]);
+            ASSERT_EQ(spared.firstRight[at], spared.secondRight[at]);
+        }
+    }
+}
+
+TEST_P(ChangingResponse, SamplesThatNobodyNotedAreNotTaken) {
+    write(0, size(), 0.5f);
+    run(true);
+    writeOut();
+    const std::vector<ComplexBin> before(spared.first->filterPartsL[0],
+                                         spared.first->filterPartsL[0] + spared.first->binCount);
+    spared.filterLeft[0] += 1.0f;
+    spared.run(true);
+    EXPECT_EQ(std::memcmp(before.data(), spared.first->filterPartsL[0],
+                          before.size() * sizeof(ComplexBin)),
+              0);
+    notes.written.include(0, 1);
+    spared.run(true);
+    EXPECT_NE(std::memcmp(before.data(), spared.first->filterPartsL[0],
+                          before.size() * sizeof(ComplexBin)),
+              0);
+}
+
+INSTANTIATE_TEST_SUITE_P(
+    Shapes,
+    ChangingResponse,
+    testing::Values(Shape{32, 1}, Shape{32, 2}, Shape{16, 5}, Shape{64, 3}, Shape{32, 17}));
+
+}  // namespace
+}  // namespace tessaly::test
