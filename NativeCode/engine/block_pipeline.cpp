@@ -98,30 +98,14 @@ void advanceRings(EngineState& state) noexcept {
     }
 }
 
-/// The second convolver takes the input into its own ring and renders the response of the block
-/// before; the first borrows that ring for the block, renders the new response and gets its own
-/// ring back, in which this block's slot keeps what it held.
-void convolveThroughCrossfade(EngineState& state) {
-    convClass& first = *state.firstOLS;
-    convClass& second = *state.secondOLS;
-    state.output.secondOLSactive = true;
-    second.process();
-    for (int i = 0; i < state.sizes.fdlCount; ++i) {
-        first.FDL[i] = second.FDL[i];
-    }
-    first.process();
-    for (int i = 0; i < state.sizes.fdlCount; ++i) {
-        first.FDL[i] = first.FDLown[i];
-    }
-}
-
 void convolve(EngineState& state) {
     if (essError != essErrorNone) {
         logOutput("Tessaly_e ERROR: no comProcessing due to essError: ", essError);
         return;
     }
     if (state.switches.fading && filterChangeAll && blockCounter != 0) {
-        convolveThroughCrossfade(state);
+        state.output.secondOLSactive = true;
+        state.firstOLS->processCrossfade(*state.secondOLS, OutputStage::crossfadeLength);
     } else {
         state.firstOLS->process();
     }

@@ -218,6 +218,7 @@ void allocateBuffers(EngineState& state) {
     state.output.prepare(state.sizes.blocklenght, state.switches.fading);
     state.frontEnd.prepareWindow(state.sizes.blocklenght);
     state.composer.prepare(state.sizes.firBufferSize);
+    state.composer.prepareKeptParts(state.switches.hrirLength, state.tail);
     if (state.switches.qvInterpolateFilters) {
         state.interpolation.prepare(state.sizes.firBufferSize);
     }
@@ -228,6 +229,7 @@ void allocateBuffers(EngineState& state) {
 
 bool buildConvolvers(EngineState& state) {
     state.firstOLS = makeConvolver(state, "firstOLSfeeded-Instanz", false);
+    state.firstOLS->watch(&state.composer.notes);
     if (state.switches.fading) {
         state.secondOLS = makeConvolver(state, "secondOLSfeeded-Instanz", true);
         shareSpectra(state);
@@ -339,6 +341,7 @@ int SpatialEngine::Stop() {
     state.frontEnd.inputHistoryBuffer.clear();
     state.composer.filterLeftBuffer.clear();
     state.composer.filterRightBuffer.clear();
+    state.composer.forget();
     state.output.clear();
     if (state.firstOLS != nullptr) {
         state.firstOLS->clearFDL();

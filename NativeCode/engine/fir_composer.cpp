@@ -2,6 +2,7 @@
 #include "engine/fir_composer.h"
 
 #include <algorithm>
+#include <bit>
 #include <cmath>
 #include <cstring>
 
@@ -14,115 +15,104 @@ namespace tessaly {
 
 namespace {
 
-constexpr int hrirLeftIndex = 1;   // the left ear takes the second value of a stored pair
-constexpr int hrirRightIndex = 0;  // the right ear the first
-
 constexpr double fixedGain1st = 0.1;
 constexpr double fixedGain2nd = 0.11;
 constexpr int wallRecords = 6;  // the first records are walls, which a room may lack
-constexpr EndFade reflectionFade{15, 0.06666667f};
 constexpr int shortestResponseWithTail = 4096;  // frames
+constexpr int syntheticTail = 1;                // the value of `qvReverb`
 constexpr int tailFadeFrames = 15;
-constexpr float widestHeldStep = 5.0f;  // degrees; a wider move composes the old pair anew
-
-EarPairs pairsOf(const float* hrir, int frames) noexcept {
-    return {hrir + hrirLeftIndex, hrir + hrirRightIndex, frames};
-}
+constexpr float widestHeldStep = 5.0f;      // degrees; a wider move composes the old pair anew
+constexpr int filteredStartFrames = 16384;  // behind a longer early part the tail is filtered anew
 
 /// Frames of a stored pair that may be read.
 int readableFrames(int frames) noexcept { return std::clamp(frames, 0, hrirMaxLength); }
 
-/// Direct sound: written, not added. Both gains are applied one after the other.
-void writeDirect(const EarBuffers& ears,
-                 const EarPairs& pairs,
-                 float lawGain,
-                 float mixGain) noexcept {
-    const FrameRange range = framesInside(0, pairs.frames, ears.size);
-    for (int i = range.begin; i < range.end; ++i) {
-        ears.left[i] = pairs.leftAt(i) * lawGain * mixGain;
-        ears.right[i] = pairs.rightAt(i) * lawGain * mixGain;
-    }
-}
-
-void composeDirect(const EarBuffers& ears, const CompositionInputs& inputs) noexcept {
-    const int frames = readableFrames(inputs.switches.hrirLength);
+ResponsePiece directPiece(const CompositionInputs& inputs) noexcept {
+    ResponsePiece piece;
+    piece.kind = ResponsePiece::Kind::Direct;
+    piece.frames = readableFrames(inputs.switches.hrirLength);
+    piece.gain = inputs.law.directGain;
     if (inputs.switches.qvTrackDirection) {
-        const float* const hrir = hrirAt(inputs.direction.indexPhi, inputs.direction.indexTheta);
-        if (hrir != nullptr) {
-            writeDirect(ears, pairsOf(hrir, frames), inputs.law.directGain, inputs.mix.directGain);
-        }
-    } else if (const float* const hrir = hrirOf(inputs.staticFilter); hrir != nullptr) {
+        piece.hrir = hrirAt(inputs.direction.indexPhi, inputs.direction.indexTheta);
+        piece.secondGain = inputs.mix.directGain;
+    } else {
         // The mix's direct gain is not applied on this path.
-        writeDirect(ears, pairsOf(hrir, frames), inputs.law.directGain, 1.0f);
+        piece.hrir = hrirOf(inputs.staticFilter);
     }
+    return piece;
 }
 
-/// One of the fixed pair: products and sum in double, rounded once at the store.
-void addFixed(const EarBuffers& ears,
-              HrirSlot slot,
-              int delay,
-              int length,
-              double gain,
-              float earlyGain) noexcept {
-    const float* const hrir = hrirOf(slot);
-    if (hrir == nullptr) {
-        return;
-    }
-    const EarPairs pairs = pairsOf(hrir, readableFrames(length));
-    const FrameRange range = framesInside(delay, pairs.frames, ears.size);
-    for (int i = range.begin; i < range.end; ++i) {
-        float& left = ears.left[delay + i];
-        float& right = ears.right[delay + i];
-        left = single(wide(left) + wide(pairs.leftAt(i)) * gain * wide(earlyGain));
-        right = single(wide(right) + wide(pairs.rightAt(i)) * gain * wide(earlyGain));
-    }
+ResponsePiece fixedPiece(
+    HrirSlot slot, int delay, int length, double gain, float earlyGain) noexcept {
+    ResponsePiece piece;
+    piece.kind = ResponsePiece::Kind::Fixed;
+    piece.hrir = hrirOf(slot);
+    piece.position = delay;
+    piece.frames = readableFrames(length);
+    piece.gain = earlyGain;
+    piece.fixedGain = gain;
+    return piece;
 }
 
-void addRecord(const EarBuffers& ears,
-               const ReflectionRecord& record,
-               int number,
-               CompositionInputs& inputs,
-               float earlyGain) noexcept {
+/// A record that does not fit has no HRIR.
+ResponsePiece recordPiece(const ReflectionRecord& record,
+                          int number,
+                          const CompositionInputs& inputs,
+                          float earlyGain) noexcept {
     const int hrirLength = inputs.switches.hrirLength;
     const int end = record.delaySamples + hrirLength;
     const bool filtered = record.filterClass >= 0;
+    ResponsePiece piece;
     if (filtered && (end >= inputs.sizes.FIR_size || end < 0)) {
         logTrace("ERROR: FIR-size ", inputs.sizes.FIR_size, " too small for ",
                  record.delaySamples + 2 * hrirLength, " this reflection no ", number,
                  "!!!! (not processed) or delay < 0");
-        return;
+        return piece;
     }
-    const float* const hrir = hrirAt(record.indexPhi, record.indexTheta);
-    if (end >= inputs.sizes.FIR_size || hrir == nullptr) {
-        return;
+    if (end >= inputs.sizes.FIR_size) {
+        return piece;
     }
-    const EarPairs pairs = pairsOf(hrir, readableFrames(hrirLength));
-    const float gain = record.gain * record.distanceGain * earlyGain;
-    if (!filtered) {
-        addPairs(ears, record.delaySamples, pairs, gain);
-        return;
+    piece.hrir = hrirAt(record.indexPhi, record.indexTheta);
+    piece.position = record.delaySamples;
+    piece.frames = readableFrames(hrirLength);
+    piece.gain = record.gain * record.distanceGain * earlyGain;
+    if (filtered) {
+        const bool firstClass = record.filterClass == 0;
+        piece.kind = ResponsePiece::Kind::Filtered;
+        piece.filterClass = firstClass ? 0 : 1;
+        piece.cutOff =
+            firstClass ? inputs.controls.reflectionLP_Fc : inputs.controls.reflectionLP2_Fc;
     }
-    const bool firstClass = record.filterClass == 0;
-    Biquad& biquad = inputs.reflections.reflectionFilter[firstClass ? 0 : 1];
-    const float cutOff =
-        firstClass ? inputs.controls.reflectionLP_Fc : inputs.controls.reflectionLP2_Fc;
-    biquad.follow(Biquad::normalise(cutOff, inputs.sampleRate));
-    addFilteredPairs(ears, record.delaySamples, pairs, gain, biquad, reflectionFade);
+    return piece;
+}
+
+bool hasTail(const CompositionInputs& inputs) noexcept {
+    return inputs.switches.qvReverb > 0 && inputs.sizes.FIR_size >= shortestResponseWithTail;
+}
+
+float tailGain(const CompositionInputs& inputs, float reverbMixGain) noexcept {
+    return inputs.tail.reverbPresetGain * reverbMixGain * inputs.law.reverbDistanceGain;
 }
 
 void addTails(const EarBuffers& ears, CompositionInputs& inputs, float reverbMixGain) noexcept {
-    if (inputs.sizes.FIR_size < shortestResponseWithTail) {
+    if (!hasTail(inputs)) {
         return;
     }
     ReverbTail& tail = inputs.tail;
-    if (inputs.switches.qvReverb == 1) {
+    if (inputs.switches.qvReverb == syntheticTail) {
         tail.addSyntheticTail(ears.left, ears.right, ears.size, inputs.switches.hrirLength,
                               inputs.switches.limitTheta, reverbMixGain);
         return;
     }
     tail.addTail(ears.left, ears.right, ears.size, inputs.controls.reverbLP_Fc, inputs.sampleRate,
-                 tail.reverbPresetGain * reverbMixGain * inputs.law.reverbDistanceGain);
+                 tailGain(inputs, reverbMixGain));
     tail.cutToRoomSize(ears.left, ears.right, ears.size, inputs.controls.roomSizeFactor);
+}
+
+void clearFrames(const EarBuffers& ears, int frames) noexcept {
+    const std::size_t bytes = static_cast<std::size_t>(frames) * sizeof(float);
+    std::memset(ears.left, 0, bytes);
+    std::memset(ears.right, 0, bytes);
 }
 
 }  // namespace
@@ -132,30 +122,41 @@ void FirComposer::prepare(int firBufferSize) {
     filterRightBuffer = AlignedArray<float>(static_cast<std::size_t>(firBufferSize));
     filterLeft = filterLeftBuffer.data();
     filterRight = filterRightBuffer.data();
+    forget();
 }
 
-void FirComposer::composeFIR(float* left, float* right, CompositionInputs& inputs) noexcept {
-    const EarBuffers ears{left, right, inputs.sizes.firBufferSize};
-    const std::size_t bytes = static_cast<std::size_t>(ears.size) * sizeof(float);
-    std::memset(left, 0, bytes);
-    std::memset(right, 0, bytes);
+void FirComposer::prepareKeptParts(int hrirLength, ReverbTail& tail) {
+    writer_.prepare(hrirLength);
+    tail.prepareStart(filteredStartFrames);
+}
 
-    composeDirect(ears, inputs);
-    if (inputs.forceUpdate) {
-        inputs.frontEnd.followDistance(inputs.law.distance);
-    }
+void FirComposer::forget() noexcept {
+    const int size = static_cast<int>(filterLeftBuffer.size());
+    startKnown_ = false;
+    endKnown_ = false;
+    notes.written.include(0, size);
+    notes.scaledEnd = {size, 1.0f};
+}
 
+void FirComposer::listPieces(CompositionInputs& inputs) noexcept {
+    const auto add = [this](const ResponsePiece& piece) noexcept {
+        if (piece.hrir != nullptr) {
+            pieces_.add(piece);
+        }
+    };
+    pieces_.clear();
+    add(directPiece(inputs));
     const EffectiveSettings& switches = inputs.switches;
-    Reflections& reflections = inputs.reflections;
+    const Reflections& reflections = inputs.reflections;
     if (switches.qvEarlyReflections || switches.qvFlexReflections) {
         earlyGain =
             inputs.mix.earlyGain * inputs.law.earlyDistanceGain * reflections.earlyPresetGain;
     }
     if (switches.qvEarlyReflections) {
-        addFixed(ears, reflections.earlyRefFilter_1st, reflections.earlyRefDelay_1st,
-                 reflections.earlyRefLength_1st, fixedGain1st, earlyGain);
-        addFixed(ears, reflections.earlyRefFilter_2nd, reflections.earlyRefDelay_2nd,
-                 reflections.earlyRefLength_2nd, fixedGain2nd, earlyGain);
+        add(fixedPiece(reflections.earlyRefFilter_1st, reflections.earlyRefDelay_1st,
+                       reflections.earlyRefLength_1st, fixedGain1st, earlyGain));
+        add(fixedPiece(reflections.earlyRefFilter_2nd, reflections.earlyRefDelay_2nd,
+                       reflections.earlyRefLength_2nd, fixedGain2nd, earlyGain));
     }
     if (switches.qvFlexReflections) {
         const int count = std::min<int>(reflections.flexReflectionCount, Reflections::capacity);
@@ -163,18 +164,118 @@ void FirComposer::composeFIR(float* left, float* right, CompositionInputs& input
             const ReflectionRecord& record = reflections.records[static_cast<std::size_t>(number)];
             const bool missingWall = number < wallRecords && record.wallDistance < 0.0f;
             if (!missingWall) {
-                addRecord(ears, record, number, inputs, earlyGain);
+                add(recordPiece(record, number, inputs, earlyGain));
             }
         }
     }
     if (switches.qvReverb > 0) {
         reverbMixGain = inputs.mix.reverbGain;
-        addTails(ears, inputs, reverbMixGain);
     }
 }
 
-void FirComposer::fadeFilterTail(int FIR_size) noexcept {
-    const int size = static_cast<int>(filterLeftBuffer.size());
+void FirComposer::composeFIR(float* left, float* right, CompositionInputs& inputs) noexcept {
+    const EarBuffers ears{left, right, inputs.sizes.firBufferSize};
+    clearFrames(ears, ears.size);
+    listPieces(inputs);
+    plainWriter_.write(ears, pieces_, inputs.sampleRate, inputs.reflections.reflectionFilter);
+    if (inputs.forceUpdate) {
+        inputs.frontEnd.followDistance(inputs.law.distance);
+    }
+    addTails(ears, inputs, reverbMixGain);
+}
+
+void FirComposer::writeWhole(const EarBuffers& ears, CompositionInputs& inputs) noexcept {
+    clearFrames(ears, ears.size);
+    writer_.write(ears, pieces_, inputs.sampleRate, inputs.reflections.reflectionFilter);
+    addTails(ears, inputs, reverbMixGain);
+    fadeFilterTail(inputs.sizes.FIR_size);
+    notes.written.include(0, ears.size);
+    notes.scaledEnd = {ears.size, 1.0f};
+}
+
+/// The tail without its gain, over all of the response.
+void FirComposer::writeEnd(const EarBuffers& ears, CompositionInputs& inputs) noexcept {
+    const LiveControls& controls = inputs.controls;
+    clearFrames(ears, ears.size);
+    inputs.tail.refreshStart(controls.reverbLP_Fc, inputs.sampleRate);
+    inputs.tail.addTail(ears.left, ears.right, ears.size, controls.reverbLP_Fc, inputs.sampleRate,
+                        1.0f);
+    inputs.tail.cutToRoomSize(ears.left, ears.right, ears.size, controls.roomSizeFactor);
+    fadeFilterTail(inputs.sizes.FIR_size);
+    notes.written.include(0, ears.size);
+}
+
+/// Direct sound, reflections and the start of the tail with its gain, up to `end`.
+void FirComposer::writeStart(const EarBuffers& ears,
+                             CompositionInputs& inputs,
+                             int end,
+                             float gain) noexcept {
+    const LiveControls& controls = inputs.controls;
+    clearFrames(ears, end);
+    writer_.write(ears, pieces_, inputs.sampleRate, inputs.reflections.reflectionFilter);
+    inputs.tail.addStart(ears.left, ears.right, end, controls.reverbLP_Fc, gain);
+    inputs.tail.cutToRoomSize(ears.left, ears.right, end, controls.roomSizeFactor);
+    fadeFilterTail(inputs.sizes.FIR_size, end);
+    notes.written.include(0, end);
+}
+
+/// The engine's own responses: what composeFIR and fadeFilterTail give, of which only that is made
+/// again which may differ. A measured tail stands without its gain behind the early part, where a
+/// change of its level costs nothing.
+void FirComposer::composeChanges(CompositionInputs& inputs) noexcept {
+    const EarBuffers ears{filterLeft, filterRight, inputs.sizes.firBufferSize};
+    listPieces(inputs);
+    if (inputs.forceUpdate) {
+        inputs.frontEnd.followDistance(inputs.law.distance);
+    }
+    if (lastTables_ != hrirTablesVersion) {
+        lastTables_ = hrirTablesVersion;
+        writer_.forget();
+        startKnown_ = false;
+    }
+    const bool samePieces = startKnown_ && pieces_ == lastPieces_;
+    lastPieces_ = pieces_;
+
+    const bool measuredTail = hasTail(inputs) && inputs.switches.qvReverb != syntheticTail;
+    const float gain = measuredTail ? tailGain(inputs, reverbMixGain) : reverbMixGain;
+    const float cutOff = inputs.controls.reverbLP_Fc;
+    const TailIngredients tail{std::bit_cast<std::uint32_t>(cutOff),
+                               std::bit_cast<std::uint32_t>(inputs.controls.roomSizeFactor)};
+    const bool sameTail = tail == lastTail_;
+    const bool sameGain = std::bit_cast<std::uint32_t>(gain) == lastGain_;
+    lastTail_ = tail;
+    lastGain_ = std::bit_cast<std::uint32_t>(gain);
+
+    const int partition = std::max(inputs.sizes.blocklenght, 1);
+    int begin = notes.scaledEnd.begin;
+    if (!endKnown_ || begin < pieces_.extent()) {
+        // Two partitions are read as they stand by a convolver that is fed directly. Never back:
+        // reflections that follow a source come and go.
+        begin = std::max(2, (pieces_.extent() + partition - 1) / partition + 1) * partition;
+    }
+    if (!measuredTail || begin >= ears.size || begin > inputs.tail.startFrames(cutOff)) {
+        const bool sameEnd = !hasTail(inputs) || (sameTail && sameGain);
+        if (endKnown_ || !samePieces || !sameEnd) {
+            writeWhole(ears, inputs);
+        }
+        startKnown_ = true;
+        endKnown_ = false;
+        return;
+    }
+    const bool sameEnd = endKnown_ && sameTail;
+    if (!sameEnd) {
+        writeEnd(ears, inputs);
+        endKnown_ = true;
+    }
+    if (!sameEnd || !samePieces || !sameGain || begin != notes.scaledEnd.begin) {
+        writeStart(ears, inputs, begin, gain);
+        startKnown_ = true;
+        notes.scaledEnd = {begin, gain};
+    }
+}
+
+void FirComposer::fadeFilterTail(int FIR_size, int end) noexcept {
+    const int size = std::min(end, static_cast<int>(filterLeftBuffer.size()));
     for (int j = 0; j < tailFadeFrames; ++j) {
         const int i = FIR_size - tailFadeFrames + j;
         if (i >= 0 && i < size) {
@@ -194,8 +295,7 @@ void FirComposer::refreshFilter(CompositionInputs& inputs,
     const bool interpolating = inputs.switches.qvInterpolateFilters;
     if (inputs.forceUpdate || (inputs.filterChange && direction.filterUpdatePending)) {
         if (!interpolating || !direction.filterUpdatePending) {
-            composeFIR(filterLeft, filterRight, inputs);
-            fadeFilterTail(inputs.sizes.FIR_size);
+            composeChanges(inputs);
         } else {
             const auto composePair = [&](std::int16_t pair) noexcept {
                 const std::size_t k = pair != 0 ? 1 : 0;
@@ -219,6 +319,7 @@ void FirComposer::refreshFilter(CompositionInputs& inputs,
         interpolation.interpolateFIR(filterLeft, filterRight, inputs.sizes.firBufferSize,
                                      inputs.switches.hrirLength, direction.filterUpdatePending,
                                      direction.interpAngleOffset);
+        forget();
     }
 }
 

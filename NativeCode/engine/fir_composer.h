@@ -1,8 +1,11 @@
 // Sums direct sound, reflections and tail into one response per ear.
 #pragma once
 
+#include <cstdint>
+
 #include "base/aligned_array.h"
 #include "base/audio_thread.h"
+#include "convolution/fir_notes.h"
 #include "engine/distance_law.h"
 #include "engine/engine_settings.h"
 #include "engine/fir_interpolation.h"
@@ -10,6 +13,7 @@
 #include "engine/input_front_end.h"
 #include "engine/live_controls.h"
 #include "engine/reflections.h"
+#include "engine/response_pieces.h"
 #include "engine/reverb_tail.h"
 #include "engine/source_direction.h"
 
@@ -37,24 +41,65 @@ class FirComposer {
 public:
     /// Load time: allocates both responses.
     void prepare(int firBufferSize);
+    /// Load time: allocates what spares filtering in later blocks.
+    void prepareKeptParts(int hrirLength, ReverbTail& tail);
 
-    /// Rebuilds both ears. Block time. `left` and `right` hold `sizes.firBufferSize` floats and are
-    /// overwritten; whatever would lie before or behind them is dropped.
+    /// Rebuilds both ears from nothing. Block time. `left` and `right` hold `sizes.firBufferSize`
+    /// floats and are overwritten; whatever would lie before or behind them is dropped.
     void composeFIR(float* left,
                     float* right,
                     CompositionInputs& inputs) noexcept TESSALY_NONBLOCKING;
     /// Divides the last 15 samples of the response by 4, 8, ... 60. Block time.
-    void fadeFilterTail(int FIR_size) noexcept TESSALY_NONBLOCKING;
+    /// @param end  samples from here on are left alone
+    void fadeFilterTail(int FIR_size, int end) noexcept TESSALY_NONBLOCKING;
+    void fadeFilterTail(int FIR_size) noexcept TESSALY_NONBLOCKING {
+        fadeFilterTail(FIR_size, static_cast<int>(filterLeftBuffer.size()));
+    }
     /// Decides what is composed and blended in this block. Block time.
     void refreshFilter(CompositionInputs& inputs,
                        FirInterpolation& interpolation) noexcept TESSALY_NONBLOCKING;
+    /// The responses were written by somebody else: the next composition starts from nothing.
+    /// Block time.
+    void forget() noexcept;
 
     AlignedArray<float> filterLeftBuffer;
     AlignedArray<float> filterRightBuffer;
-    float* filterLeft = nullptr;   ///< `firBufferSize` floats
-    float* filterRight = nullptr;  ///< `firBufferSize` floats
-    float earlyGain = 0.0f;        ///< of the last composition
-    float reverbMixGain = 0.0f;    ///< of the last composition
+    /// `firBufferSize` floats; from `notes.scaledEnd.begin` on without the gain of the tail.
+    float* filterLeft = nullptr;
+    float* filterRight = nullptr;  ///< likewise
+    /// For the convolver: what was written, and the end of the tail that stands without its gain.
+    FirNotes notes;
+    float earlyGain = 0.0f;      ///< of the last composition
+    float reverbMixGain = 0.0f;  ///< of the last composition
+
+private:
+    /// What decides the samples of the tail but its gain. Floats as their bits, so that equal means
+    /// equal.
+    struct TailIngredients {
+        std::uint32_t cutOff = 0;
+        std::uint32_t roomSizeFactor = 0;
+
+        bool operator==(const TailIngredients&) const = default;
+    };
+
+    void listPieces(CompositionInputs& inputs) noexcept;
+    void composeChanges(CompositionInputs& inputs) noexcept;
+    void writeWhole(const EarBuffers& ears, CompositionInputs& inputs) noexcept;
+    void writeEnd(const EarBuffers& ears, CompositionInputs& inputs) noexcept;
+    void writeStart(const EarBuffers& ears,
+                    CompositionInputs& inputs,
+                    int end,
+                    float gain) noexcept;
+
+    PieceList pieces_;         ///< of this composition
+    PieceList lastPieces_;     ///< of the responses as they stand
+    PieceWriter writer_;       ///< for the engine's responses
+    PieceWriter plainWriter_;  ///< keeps nothing
+    TailIngredients lastTail_;
+    std::uint32_t lastGain_ = 0;    ///< of the tail
+    std::uint32_t lastTables_ = 0;  ///< version of the HRIR tables
+    bool startKnown_ = false;       ///< up to the scaled end: what the last ingredients make
+    bool endKnown_ = false;         ///< from there on
 };
 
 }  // namespace tessaly

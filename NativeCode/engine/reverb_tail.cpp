@@ -71,12 +71,57 @@ void ReverbTail::addTail(float* left,
         return;
     }
     // The unfiltered tail has no fade at its end.
-    if (!hasReverbLowPass || reverbLP_Fc >= unfilteredCutOff) {
+    if (!filtered(reverbLP_Fc)) {
         addPairs(ears, 0, pairs, gain);
         return;
     }
     reverbLowPass.follow(Biquad::normalise(reverbLP_Fc, sampleRate));
     addFilteredPairs(ears, 0, pairs, gain, reverbLowPass, tailFade);
+}
+
+bool ReverbTail::filtered(float reverbLP_Fc) const noexcept {
+    return hasReverbLowPass && !(reverbLP_Fc >= unfilteredCutOff);
+}
+
+void ReverbTail::prepareStart(int frames) {
+    const auto count = static_cast<std::size_t>(
+        hasReverbLowPass ? std::clamp(frames, 0, std::max(reverbLength, 0)) : 0);
+    filteredLeft_ = AlignedArray<float>(count);
+    filteredRight_ = AlignedArray<float>(count);
+}
+
+int ReverbTail::startFrames(float reverbLP_Fc) const noexcept {
+    return filtered(reverbLP_Fc) ? static_cast<int>(filteredLeft_.size()) : reverbLength;
+}
+
+void ReverbTail::refreshStart(float reverbLP_Fc, int sampleRate) noexcept {
+    const int frames = static_cast<int>(filteredLeft_.size());
+    if (frames == 0 || !filtered(reverbLP_Fc)) {
+        return;
+    }
+    filteredLeft_.clear();
+    filteredRight_.clear();
+    addTail(filteredLeft_.data(), filteredRight_.data(), frames, reverbLP_Fc, sampleRate, 1.0f);
+}
+
+void ReverbTail::addStart(
+    float* left, float* right, int frames, float reverbLP_Fc, float gain) const noexcept {
+    if (!filtered(reverbLP_Fc)) {
+        const int stored = static_cast<int>(reverbIR.size() / 2);
+        if (stored > 0) {
+            const float* const tail = reverbIR.data();
+            addPairs({left, right, std::min(frames, stored)}, 0, {tail, tail + 1, reverbLength},
+                     gain);
+        }
+        return;
+    }
+    const int kept = std::min(frames, static_cast<int>(filteredLeft_.size()));
+    const float* const tailLeft = filteredLeft_.data();
+    const float* const tailRight = filteredRight_.data();
+    for (int i = 0; i < kept; ++i) {
+        left[i] += tailLeft[i] * gain;
+        right[i] += tailRight[i] * gain;
+    }
 }
 
 void ReverbTail::addSyntheticTail(float* left,

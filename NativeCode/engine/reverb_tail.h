@@ -26,6 +26,20 @@ public:
                  float reverbLP_Fc,
                  int sampleRate,
                  float gain) noexcept TESSALY_NONBLOCKING;
+    /// Memory for the filtered form of the first frames, if the room has a filter. Load time:
+    /// allocates.
+    void prepareStart(int frames);
+    /// Frames at the start that `addStart` can give.
+    int startFrames(float reverbLP_Fc) const noexcept;
+    /// Filters the start anew. Block time.
+    void refreshStart(float reverbLP_Fc, int sampleRate) noexcept TESSALY_NONBLOCKING;
+    /// Adds the first frames only, as `addTail` does. Block time.
+    /// @param frames  up to `startFrames`; the buffers hold as many
+    void addStart(float* left,
+                  float* right,
+                  int frames,
+                  float reverbLP_Fc,
+                  float gain) const noexcept TESSALY_NONBLOCKING;
     /// The synthetic tail of 26 sparse HRIRs. Block time.
     void addSyntheticTail(float* left,
                           float* right,
@@ -49,6 +63,11 @@ public:
     std::string IRfilePath;
     bool hasReverbLowPass = false;
     Biquad reverbLowPass;
+
+private:
+    AlignedArray<float> filteredLeft_;   ///< the start through the low-pass, without a gain
+    AlignedArray<float> filteredRight_;  ///< likewise
+    bool filtered(float reverbLP_Fc) const noexcept;
 };
 
 }  // namespace tessaly

@@ -97,6 +97,7 @@ bool HrirDatabase::load(int instanceNumber, HrirRequest request) {
     source.sampleRate = settings_.sampleRate;
     // An unreadable set stays silent; its code in `essError` is for the handler.
     readWav(source, databaseFileName, HRTFStream, databaseFrames, hrirChannels);
+    ++hrirTablesVersion;
 
     mappingReflections = false;
     if (settings_.qvTrackDirection) {
@@ -240,6 +241,7 @@ bool HrirDatabase::loadFilterFile(HrirSlot& slot, HrirRequest request) {
     }
     if (settings_.bypass3DAudio) {
         writePanPair(*entry, settings_.hrirLength, request.phi, settings_.panGain);
+        ++hrirTablesVersion;
     }
     slot = entry;
     ++fileCount;
@@ -286,6 +288,7 @@ bool HrirDatabase::loadOwnFile(HrirSlot& slot, HrirRequest request) {
     source.usePackedDatabase = false;
     source.sampleRate = settings_.sampleRate;
     readWav(source, filterFileName, *entry, settings_.hrirLength, hrirChannels);
+    ++hrirTablesVersion;
     slot = entry;
     return true;
 }

@@ -15,6 +15,7 @@ constinit float* hrirTable[hrirCount] = {};
 constinit HrirSlot filterTable[gridCellCount] = {};
 constinit int nextFreeHrir = 0;
 constinit std::uint8_t databaseBypassMode = 0;
+constinit std::uint32_t hrirTablesVersion = 0;
 
 namespace {
 
@@ -46,6 +47,7 @@ void replaceHrirStream(int hrirLength) {
         hrirTable[k] = stream.data() + k * stride;
     }
     HRTFStream = stream.data();
+    ++hrirTablesVersion;
     *streamOwner = std::move(stream);
 }
 
@@ -57,6 +59,7 @@ HrirSlot appendHrir(int hrirLength) {
     HrirSlot entry = &hrirTable[nextFreeHrir];
     *entry = entryOwners->emplace_back(frames * 2).data();
     ++nextFreeHrir;
+    ++hrirTablesVersion;
     return entry;
 }
 
@@ -66,6 +69,7 @@ void resetHrirTables() {
     HRTFStream = nullptr;
     nextFreeHrir = 0;
     databaseBypassMode = 0;
+    ++hrirTablesVersion;
     *streamOwner = {};
     entryOwners->clear();
 }

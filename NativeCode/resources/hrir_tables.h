@@ -26,6 +26,9 @@ extern constinit HrirSlot filterTable[gridCellCount];
 extern constinit int nextFreeHrir;
 /// The `bypass3DAudio` value with which `filterTable` was last built.
 extern constinit std::uint8_t databaseBypassMode;
+/// Steps whenever samples behind the table may have changed, so that a reader who keeps what it
+/// made of them knows. Written by database loads.
+extern constinit std::uint32_t hrirTablesVersion;
 
 /// The cell of a direction, or null for indices off the grid. Block time.
 HrirSlot* filterTableCell(int indexPhi, int indexTheta) noexcept;

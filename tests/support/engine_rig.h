@@ -25,6 +25,14 @@ inline void resetProcess() {
     resetHrirTables();
 }
 
+/// One sample of the composed response, as it counts.
+/// @param ear  0 left, 1 right
+inline float composedSample(const FirComposer& composer, int ear, int i) {
+    const float stored = ear == 0 ? composer.filterLeft[i] : composer.filterRight[i];
+    const ScaledEnd& end = composer.notes.scaledEnd;
+    return i >= end.begin ? stored * end.gain : stored;
+}
+
 /// A fixture whose cases each start like a new process, with no engine alive.
 class EngineFixture : public ::testing::Test {
 protected:

@@ -1,0 +1,212 @@
+// The engine's own responses, of which only that is made again which may differ, against the
+// composition from nothing.
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <cmath>
+#include <cstddef>
+#include <memory>
+#include <random>
+
+#include "engine/fir_composer_fixture.h"
+#include "support/log_capture.h"
+
+namespace tessaly::test {
+namespace {
+
+/// Room with records of all three kinds, with or without a tail and its low-pass.
+class ComposerChanges : public FirComposerTest {
+protected:
+    void setUp(int tailFrames, bool lowPass) {
+        setSizes(8192, 512);
+        direction.filterUpdatePending = true;
+        tail.reverbLength = tailFrames;
+        tail.reverbIR = AlignedArray<float>(static_cast<std::size_t>(2 * tailFrames));
+        for (float& sample : tail.reverbIR) {
+            sample = uniform(-1.0f, 1.0f);
+        }
+        tail.reverbPresetGain = 0.05f;
+        tail.hasReverbLowPass = lowPass;
+        tail.reverbLowPass = Biquad(Biquad::lowPass, 0.0, 0.1);
+        switches.qvReverb = static_cast<std::int16_t>(tailFrames > 0 ? 20 : 0);
+        reflections.reflectionFilter.fill(Biquad(Biquad::lowPass, 0.0, 0.1));
+        store(40, 20);
+        store(41, 20);
+        for (int number = 0; number < 12; ++number) {
+            addRecord(200 + 150 * number, number % 3 - 1);
+        }
+        composer.prepare(sizes.firBufferSize);
+        composer.prepareKeptParts(switches.hrirLength, tail);
+        plain = std::make_unique<FirComposer>();
+        plain->prepare(sizes.firBufferSize);
+    }
+    float uniform(float low, float high) {
+        return std::uniform_real_distribution<float>(low, high)(random);
+    }
+    int whole(int low, int high) { return std::uniform_int_distribution<int>(low, high)(random); }
+
+    /// Changes one of the ingredients, or none.
+    void changeSomething() {
+        ReflectionRecord& record = reflections.records[static_cast<std::size_t>(whole(0, 11))];
+        switch (whole(0, 12)) {
+            case 0:
+                law.directGain = uniform(0.0f, 1.0f);
+                break;
+            case 1:
+                direction.indexPhi = static_cast<std::int16_t>(whole(40, 41));
+                break;
+            case 2:
+                record.delaySamples = static_cast<std::int16_t>(whole(-200, 3000));
+                break;
+            case 3:
+                record.delaySamples = static_cast<std::int16_t>(whole(3000, 8300));
+                break;
+            case 4:
+                record.distanceGain = uniform(0.0f, 1.0f);
+                break;
+            case 5:
+                record.wallDistance = uniform(-1.0f, 1.0f);
+                break;
+            case 6:
+                mix.earlyGain = uniform(0.0f, 1.0f);
+                break;
+            case 7:
+                mix.reverbGain = whole(0, 3) == 0 ? 0.0f : uniform(0.0f, 1.0f);
+                break;
+            case 8:
+                law.reverbDistanceGain = uniform(0.0f, 1.0f);
+                break;
+            case 9:
+                controls.reverbLP_Fc = whole(0, 1) == 0 ? 20000.0f : uniform(500.0f, 20000.0f);
+                break;
+            case 10:
+                controls.roomSizeFactor = whole(0, 1) == 0 ? 1.0f : uniform(0.0f, 1.0f);
+                break;
+            case 11:
+                controls.reflectionLP_Fc = uniform(500.0f, 20000.0f);
+                break;
+            default:
+                break;
+        }
+    }
+
+    /// Composes both ways and compares every sample as it counts.
+    void composeBoth() {
+        CompositionInputs in = inputs();
+        composer.refreshFilter(in, interpolation);
+        plain->composeFIR(plain->filterLeft, plain->filterRight, in);
+        plain->fadeFilterTail(sizes.FIR_size);
+        const ScaledEnd& end = composer.notes.scaledEnd;
+        for (int i = 0; i < sizes.firBufferSize; ++i) {
+            const float gain = i >= end.begin ? end.gain : 1.0f;
+            compare(plain->filterLeft[i], composer.filterLeft[i] * gain);
+            compare(plain->filterRight[i], composer.filterRight[i] * gain);
+        }
+        EXPECT_EQ(composer.earlyGain, plain->earlyGain);
+        EXPECT_EQ(composer.reverbMixGain, plain->reverbMixGain);
+    }
+    void compare(float expected, float got) {
+        worst = std::max(worst, std::abs(static_cast<double>(expected) - static_cast<double>(got)));
+        largest = std::max(largest, std::abs(static_cast<double>(expected)));
+    }
+    /// What a convolver does with the notes.
+    FirStretch take() {
+        const FirStretch written = composer.notes.written;
+        composer.notes.written.clear();
+        return written;
+    }
+
+    std::mt19937 random{5};
+    std::unique_ptr<FirComposer> plain;
+    double worst = 0.0;
+    double largest = 0.0;
+};
+
+TEST_F(ComposerChanges, EqualTheCompositionFromNothingThroughEveryChange) {
+    const struct {
+        int tailFrames;
+        bool lowPass;
+    } rooms[] = {{0, false}, {7000, false}, {7000, true}, {8600, true}, {900, false}};
+    const LogCapture quiet;
+    for (const auto& room : rooms) {
+        SCOPED_TRACE(room.tailFrames);
+        reflections = {};
+        controls = {};
+        setUp(room.tailFrames, room.lowPass);
+        for (int n = 0; n < 300; ++n) {
+            SCOPED_TRACE(n);
+            changeSomething();
+            composeBoth();
+            ASSERT_LT(worst, 2e-7);
+        }
+        EXPECT_GT(largest, 0.1);
+    }
+}
+
+TEST_F(ComposerChanges, TheSyntheticTailIsMadeAgainEachTime) {
+    const LogCapture quiet;
+    setUp(0, false);
+    switches.qvReverb = 1;
+    for (int n = 0; n < 60; ++n) {
+        changeSomething();
+        composeBoth();
+        ASSERT_EQ(worst, 0.0);
+    }
+}
+
+TEST_F(ComposerChanges, SayWhichSamplesWereWritten) {
+    const LogCapture quiet;
+    setUp(7000, false);
+    composeBoth();
+    EXPECT_EQ(take().end, sizes.firBufferSize) << "the first time all of it";
+    const int begin = composer.notes.scaledEnd.begin;
+    EXPECT_GE(begin, 200 + 150 * 11 + 128);
+    EXPECT_LT(begin, sizes.firBufferSize / 2);
+
+    composeBoth();
+    EXPECT_TRUE(take().empty()) << "nothing changed";
+
+    law.directGain *= 0.5f;
+    composeBoth();
+    EXPECT_LE(take().end, begin);
+
+    law.reverbDistanceGain *= 0.5f;
+    composeBoth();
+    EXPECT_LE(take().end, begin) << "the end's level is a note, not samples";
+    EXPECT_EQ(composer.notes.scaledEnd.gain, 0.05f * 0.4f * 0.4f);
+
+    controls.roomSizeFactor = 0.7f;
+    composeBoth();
+    EXPECT_EQ(take().end, sizes.firBufferSize);
+    EXPECT_LT(worst, 1e-7);
+}
+
+TEST_F(ComposerChanges, ALaterReflectionMovesTheEndAndItStays) {
+    const LogCapture quiet;
+    setUp(7000, false);
+    composeBoth();
+    const int begin = composer.notes.scaledEnd.begin;
+    reflections.records[3].delaySamples = 4000;
+    composeBoth();
+    EXPECT_GE(composer.notes.scaledEnd.begin, 4000 + 128);
+    EXPECT_EQ(composer.notes.scaledEnd.begin % 512, 0);
+    const int moved = composer.notes.scaledEnd.begin;
+    EXPECT_GT(moved, begin);
+    reflections.records[3].delaySamples = 300;
+    composeBoth();
+    EXPECT_EQ(composer.notes.scaledEnd.begin, moved);
+    EXPECT_LT(worst, 1e-7);
+}
+
+TEST_F(ComposerChanges, NewSamplesBehindTheTablesAreSeen) {
+    const LogCapture quiet;
+    setUp(0, false);
+    composeBoth();
+    store(40, 20);
+    ++hrirTablesVersion;
+    composeBoth();
+    EXPECT_EQ(worst, 0.0);
+}
+
+}  // namespace
+}  // namespace tessaly::test
