@@ -183,10 +183,8 @@ convClass::convClass(std::string instanceNameIn,
     }
     allocSpectrum(accumL, binCount);
     allocSpectrum(accumR, binCount);
-    if (isSecondInstance == 0) {
-        for (ComplexBin** const spectrum : {&partL_, &partR_, &endL_, &endR_}) {
-            allocSpectrum(*spectrum, binCount);
-        }
+    for (ComplexBin** const spectrum : {&partL_, &partR_, &endL_, &endR_}) {
+        allocSpectrum(*spectrum, binCount);
     }
     scaled_.begin = count;
     changed_.resize(count);
@@ -218,10 +216,8 @@ convClass::~convClass() {
     }
     freeSpectrum(accumL);
     freeSpectrum(accumR);
-    if (isSecondInstance == 0) {
-        for (ComplexBin** const spectrum : {&partL_, &partR_, &endL_, &endR_}) {
-            freeSpectrum(*spectrum);
-        }
+    for (ComplexBin** const spectrum : {&partL_, &partR_, &endL_, &endR_}) {
+        freeSpectrum(*spectrum);
     }
 }
 
@@ -452,7 +448,7 @@ void convClass::accumulate() noexcept {
         clearSpectrum(accumR, binCount - 1);
         return;
     }
-    if (compensated || isSecondInstance != 0) {
+    if (compensated) {
         kernels_->ringSum(static_cast<std::size_t>(binCount), partitions, newestSlot(), FDL.data(),
                           left, right, accumL, accumR);
         return;
@@ -523,6 +519,7 @@ void convClass::addSums(const convClass& ring,
 
 /// The plain order of a crossfade block, for all cases that the shared sum does not cover.
 void convClass::borrowAndProcess(convClass& second) noexcept {
+    second.scaled_ = scaled_;  // it renders with these spectra as they stand
     second.process();
     std::copy(second.FDL.begin(), second.FDL.end(), FDL.begin());
     process();

@@ -253,8 +253,12 @@ void FirComposer::composeChanges(CompositionInputs& inputs) noexcept {
         // reflections that follow a source come and go.
         begin = std::max(2, (pieces_.extent() + partition - 1) / partition + 1) * partition;
     }
-    if (!measuredTail || begin >= ears.size || begin > inputs.tail.startFrames(cutOff)) {
-        const bool sameEnd = !hasTail(inputs) || (sameTail && sameGain);
+    // What is blended afterwards has to stand as it counts. The synthetic tail looks its directions
+    // up anew each time.
+    const bool blended = inputs.switches.qvInterpolateFilters;
+    const bool synthetic = hasTail(inputs) && !measuredTail;
+    if (!measuredTail || blended || begin >= ears.size || begin > inputs.tail.startFrames(cutOff)) {
+        const bool sameEnd = !hasTail(inputs) || (sameTail && sameGain && !synthetic);
         if (endKnown_ || !samePieces || !sameEnd) {
             writeWhole(ears, inputs);
         }

@@ -212,6 +212,17 @@ TEST_F(EngineHeadphone, LongerBlocksThanTheSpectrumTakeZerosBehindIt) {
     for (const float sample : play(*second, 2)) {
         ASSERT_TRUE(std::isfinite(sample));
     }
+    const convClass& convolver = *second->state().firstOLS;
+    ASSERT_EQ(convolver.FDLtoBUFConv, 1);
+    ASSERT_LT(HpTF_FreqBins, convolver.binCount);
+    for (const ComplexBin* spectrum : {convolver.hpTFspectrumL, convolver.hpTFspectrumR}) {
+        ASSERT_NE(spectrum, nullptr);
+        for (std::int32_t k = HpTF_FreqBins; k < convolver.binCount; ++k) {
+            ASSERT_EQ(spectrum[k].re, 0.0f) << k;
+            ASSERT_EQ(spectrum[k].im, 0.0f) << k;
+        }
+        EXPECT_NE(spectrum[1].re, 0.0f);
+    }
 }
 
 TEST_F(EngineHeadphone, AnyOrderOfEnginesSelectionsAndBlockLengths) {

@@ -416,8 +416,8 @@ TEST_F(EngineRooms, ThreeHundredRoomChangesInThreeHundredBlocks) {
         double most = 0.0;
         const EngineState& state = rig->state();
         for (int i = 0; i < state.sizes.FIR_size; ++i) {
-            most += std::max(std::abs(static_cast<double>(state.composer.filterLeft[i])),
-                             std::abs(static_cast<double>(state.composer.filterRight[i])));
+            most += std::max(std::abs(static_cast<double>(composedSample(state.composer, 0, i))),
+                             std::abs(static_cast<double>(composedSample(state.composer, 1, i))));
         }
         double peak = 0.0;
         for (const float sample : rig->output) {

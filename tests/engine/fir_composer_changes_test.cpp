@@ -154,6 +154,33 @@ TEST_F(ComposerChanges, TheSyntheticTailIsMadeAgainEachTime) {
     }
 }
 
+TEST_F(ComposerChanges, TheSyntheticTailFollowsCellsThatAreMappedAnew) {
+    const LogCapture quiet;
+    setUp(0, false);
+    switches.qvReverb = 1;
+    composeBoth();
+    *filterTableCell(0, 0) = storeLoose();  // the first tap's direction
+    composeBoth();
+    EXPECT_EQ(worst, 0.0);
+}
+
+TEST_F(ComposerChanges, ABlendKeepsTheTailsLevelBehindIt) {
+    const LogCapture quiet;
+    setUp(7000, false);
+    interpolation.prepare(sizes.firBufferSize);
+    switches.qvInterpolateFilters = true;
+    forceUpdate = true;
+    direction.filterUpdatePending = false;
+    CompositionInputs in = inputs();
+    composer.refreshFilter(in, interpolation);
+    plain->composeFIR(plain->filterLeft, plain->filterRight, in);
+    const ScaledEnd& end = composer.notes.scaledEnd;
+    for (int i = 4000; i < 6500; ++i) {
+        const float gain = i >= end.begin ? end.gain : 1.0f;
+        ASSERT_FLOAT_EQ(composer.filterLeft[i] * gain, plain->filterLeft[i]) << i;
+    }
+}
+
 TEST_F(ComposerChanges, SayWhichSamplesWereWritten) {
     const LogCapture quiet;
     setUp(7000, false);

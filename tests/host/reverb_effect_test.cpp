@@ -7,6 +7,7 @@
 #include <cmath>
 #include <cstdint>
 #include <limits>
+#include <memory>
 #include <vector>
 
 #include "base/ess_error.h"
@@ -176,6 +177,21 @@ TEST_F(ReverbEffectTest, EitherReleaseOfASharedIdErasesIt) {
     load();
     set(P_REVERB_ID, 5.0f);
     EXPECT_EQ(run(countedSamples(2 * frames)), silence);
+}
+
+TEST_F(ReverbEffectTest, TheFirstTakersReleaseErasesASharedIdUnderTheSecond) {
+    auto first = std::make_unique<HostInstance>(rate, frames);
+    reverbCreate(&first->state);
+    reverbSetFloatParameter(&first->state, P_REVERB_ID, 5.0f);
+    load();
+    set(P_REVERB_ID, 5.0f);
+    reverbRelease(&first->state);
+    first.reset();
+    EXPECT_EQ(findMixBuffer(5), nullptr);
+    EXPECT_EQ(run(countedSamples(2 * frames)), silence) << "the second one has lost its buffer";
+    set(P_REVERB_ID, 6.0f);
+    ASSERT_NE(findMixBuffer(6), nullptr) << "a new ID is a new buffer";
+    EXPECT_EQ(findMixBuffer(5), nullptr);
 }
 
 TEST_F(ReverbEffectTest, OtherChannelCountsAreCopiedFlat) {

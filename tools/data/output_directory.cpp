@@ -100,7 +100,7 @@ void OutputDirectory::removeTemporaries() noexcept {
 }
 
 void OutputDirectory::add(const std::string& name, std::string bytes) {
-    files_.push_back({name, std::move(bytes), {}});
+    files_.push_back({name, std::move(bytes), {}, {}});
 }
 
 void OutputDirectory::commit() {
@@ -112,20 +112,48 @@ void OutputDirectory::commit() {
         file.temporary = temporaryName(directory_, file.name);
         writeFile(file.temporary, file.bytes);
     }
+    // What is replaced steps aside until all are in place.
     for (std::size_t i = 0; i < files_.size(); ++i) {
+        File& file = files_[i];
+        const fs::path place = directory_ / file.name;
         std::error_code error;
-        fs::rename(files_[i].temporary, directory_ / files_[i].name, error);
-        if (error) {
-            for (std::size_t j = 0; j < i; ++j) {
-                std::error_code ignored;
-                fs::remove(directory_ / files_[j].name, ignored);
+        if (fs::exists(place, error)) {
+            file.former = temporaryName(directory_, fmt::format("{}.former{}", file.name, i));
+            fs::rename(place, file.former, error);
+            if (error) {
+                file.former.clear();
             }
-            throw DataError("cannot put {} into {}: {}", files_[i].name, directory_.string(),
+        }
+        if (!error) {
+            fs::rename(file.temporary, place, error);
+        }
+        if (error) {
+            putFormerFilesBack();
+            throw DataError("cannot put {} into {}: {}", file.name, directory_.string(),
                             error.message());
         }
-        files_[i].temporary.clear();
+        file.temporary.clear();
+    }
+    for (const File& file : files_) {
+        std::error_code ignored;
+        if (!file.former.empty()) {
+            fs::remove(file.former, ignored);
+        }
     }
     committed_ = true;
+}
+
+/// The last one replaced first: a name may have been given twice.
+void OutputDirectory::putFormerFilesBack() noexcept {
+    std::for_each(files_.rbegin(), files_.rend(), [this](const File& file) {
+        std::error_code ignored;
+        if (file.temporary.empty()) {
+            fs::remove(directory_ / file.name, ignored);
+        }
+        if (!file.former.empty()) {
+            fs::rename(file.former, directory_ / file.name, ignored);
+        }
+    });
 }
 
 std::string readIfPresent(const fs::path& path) {

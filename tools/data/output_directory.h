@@ -30,9 +30,11 @@ private:
     struct File {
         std::string name;
         std::string bytes;
-        std::filesystem::path temporary;
+        std::filesystem::path temporary;  ///< empty once it is in its place
+        std::filesystem::path former;     ///< where the file of this name went, if there was one
     };
     void removeTemporaries() noexcept;
+    void putFormerFilesBack() noexcept;
 
     std::filesystem::path directory_;
     std::vector<std::filesystem::path> created_;  ///< outermost first

@@ -55,6 +55,23 @@ TEST(OutputDirectory, ExistingFilesStayUntilCommit) {
     EXPECT_EQ(scratch.entryCount(), 1);
 }
 
+TEST(OutputDirectory, AFailureHalfWayPutsFormerFilesBack) {
+    const ScratchDirectory scratch;
+    std::ofstream(scratch.path() / "one") << "old one";
+    std::ofstream(scratch.path() / "two") << "old two";
+    {
+        OutputDirectory output(scratch.path());
+        output.add("two", "new two");
+        output.add("new", "nothing before");
+        output.add("one", "new one");
+        output.add("one", "a second file of this name has no passing file left");
+        EXPECT_THROW(output.commit(), DataError);
+    }
+    EXPECT_EQ(readIfPresent(scratch.path() / "one"), "old one");
+    EXPECT_EQ(readIfPresent(scratch.path() / "two"), "old two");
+    EXPECT_EQ(scratch.entryCount(), 2);
+}
+
 TEST(OutputDirectory, ATargetThatIsADirectoryStopsAllFiles) {
     const ScratchDirectory scratch;
     fs::create_directory(scratch.path() / "two");
