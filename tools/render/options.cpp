@@ -40,6 +40,7 @@ RenderOptions parseOptions(int argumentCount,
     app.add_option("--report", typed.report,
                    "Directory for a page, index.html, with sounds, pictures and measurements")
         ->type_name("DIR");
+    app.add_option("--title", typed.title, "Heading of the page")->type_name("TEXT");
     app.add_option("--format", typed.format, "Samples: float (default), 16 or 24 bits")
         ->type_name("NAME");
     app.add_option("--picture", typed.picture, "SVG to write; default: the output's name")

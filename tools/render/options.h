@@ -23,6 +23,7 @@ struct RenderOptions {
     std::filesystem::path output;  ///< WAV file to write, empty for none; a directory for all rooms
     std::filesystem::path picture;  ///< SVG file to write; empty for none
     std::filesystem::path report;   ///< directory of the page to write; empty for none
+    std::string title;              ///< of the page; empty: told by what is on it
     SampleFormat format = SampleFormat::Float;
     SourcePath path = OrbitPath{};
     std::optional<double> orbitPeriod;  ///< seconds a turn; decides the turns with the duration

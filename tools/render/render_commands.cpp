@@ -95,7 +95,8 @@ void finish(const RenderOptions& options,
         writeText(*picture, pictureOf(renderings[0].scene, renderings[0].inputs.duration,
                                       renderings[0].result.stereo));
     }
-    const std::string title = renderings.size() == 1 && !renderings[0].scene.title.empty()
+    const std::string title = !options.title.empty() ? options.title
+                              : renderings.size() == 1 && !renderings[0].scene.title.empty()
                                   ? renderings[0].scene.title
                                   : "Tessaly";
     std::vector<std::vector<std::string>> warnings;
@@ -266,8 +267,9 @@ void renderEveryRoom(const RenderOptions& options) {
         }
     }
     if (!options.report.empty()) {
-        writeReport(reportOf(scene.title + " in every room", introduction, std::move(renderings)),
-                    options.report);
+        const std::string title =
+            options.title.empty() ? scene.title + " in every room" : options.title;
+        writeReport(reportOf(title, introduction, std::move(renderings)), options.report);
     }
     for (RoomFiles& one : files) {
         if (one.picture) {

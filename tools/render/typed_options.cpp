@@ -334,6 +334,10 @@ RenderOptions optionsFromTexts(const TypedOptions& typed,
     }
     options.scenes.assign(typed.scenes.begin(), typed.scenes.end());
     options.report = typed.report;
+    if (typed.report.empty()) {
+        refuse(typed.title, "--title", "sounds alone: use --report");
+    }
+    options.title = typed.title;
     options.dataDirectory =
         typed.data.empty() ? defaultDataDirectory : std::filesystem::path(typed.data);
     options.library = typed.library;

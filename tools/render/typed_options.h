@@ -17,6 +17,7 @@ struct TypedOptions {
     std::vector<std::string> scenes;
     std::string output;
     std::string report;
+    std::string title;
     std::string data;
     std::string library;
     std::string at;

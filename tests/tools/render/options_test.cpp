@@ -115,6 +115,8 @@ TEST(Options, EveryRoomGoesIntoADirectory) {
 TEST(Options, APageCanStandInForTheSound) {
     const RenderOptions options = parse({"in.wav", "--report", "page"});
     EXPECT_EQ(options.report, "page");
+    EXPECT_EQ(options.title, "");
+    EXPECT_EQ(parse({"in.wav", "--report", "page", "--title", "Rooms"}).title, "Rooms");
     EXPECT_TRUE(options.output.empty());
     EXPECT_TRUE(options.picture.empty());
     EXPECT_EQ(parseWith({"--report", "page"}).output, "x.wav");
