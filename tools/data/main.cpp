@@ -1,7 +1,11 @@
 // tessaly-data: makes and checks the data files of the plug-in.
+#include <fmt/format.h>
+
 #include <CLI/CLI.hpp>
 #include <cstdio>
 #include <exception>
+#include <string>
+#include <vector>
 
 #include "data/build_command.h"
 #include "data/data_error.h"
@@ -11,6 +15,8 @@
 namespace {
 
 using namespace tessaly::data;
+
+constexpr int usageFailure = 2;
 
 /// What the command line gives as words, shared by the building commands.
 struct Words {
@@ -87,6 +93,23 @@ void readWords(const Words& words, BuildCommand& command) {
     }
 }
 
+/// Prints help, version, or in one line what cannot be understood; gives the exit code.
+int answerTo(const CLI::App& application, const CLI::ParseError& error) {
+    if (error.get_exit_code() == 0) {
+        return application.exit(error);
+    }
+    std::string text = error.what();
+    text = text.substr(0, text.find('\n'));
+    const std::vector<std::string> unknown = application.remaining();
+    if (application.get_subcommands().empty() && !unknown.empty()) {
+        const bool option = unknown.front().rfind('-', 0) == 0;
+        text = fmt::format("unknown {} \"{}\": all, hrir, tails, headphones or verify comes first",
+                           option ? "option" : "subcommand", unknown.front());
+    }
+    std::fprintf(stderr, "tessaly-data: %s\n", text.c_str());
+    return usageFailure;
+}
+
 int run(int argumentCount, char** arguments) {
     CLI::App application("Makes and checks the data files of the Tessaly plug-in", "tessaly-data");
     application.require_subcommand(1);
@@ -128,7 +151,11 @@ int run(int argumentCount, char** arguments) {
     verify->add_option("directory", directory, "data directory")->required();
     verify->add_option("--sofa", sofa, "measured set to compare with, if not the recorded one");
 
-    CLI11_PARSE(application, argumentCount, arguments);
+    try {
+        application.parse(argumentCount, arguments);
+    } catch (const CLI::ParseError& error) {
+        return answerTo(application, error);
+    }
     if (verify->parsed()) {
         return runVerify(directory, sofa) ? 0 : 1;
     }

@@ -56,10 +56,30 @@ TEST_F(Program, WrongOptionsLeaveNothing) {
     expectRefusal("hrir --out out --symmetry perhaps", "expected auto, on or off");
     expectRefusal("hrir --out out --taps 1000", "1000 taps, expected 32 to 256");
     expectRefusal("hrir --out out --gain nan", "gain is nan dB");
-    EXPECT_NE(run("").code, 0);
-    EXPECT_NE(run("hrir").code, 0);
-    EXPECT_NE(run("hrir --out out --unheard-of").code, 0);
-    EXPECT_FALSE(fs::exists(scratch.path() / "out"));
+}
+
+TEST_F(Program, UsageErrorsAreOneLine) {
+    for (const auto& [arguments, says] :
+         {std::pair("", "subcommand is required"),
+          std::pair("biuld --out out", "unknown subcommand \"biuld\": all, hrir, tails"),
+          std::pair("--unheard-of", "unknown option \"--unheard-of\""),
+          std::pair("hrir", "--out is required"),
+          std::pair("hrir --out out --unheard-of", "--unheard-of"),
+          std::pair("hrir --out out --taps many", "many")}) {
+        const Outcome outcome = run(arguments);
+        EXPECT_EQ(outcome.code, 2) << arguments;
+        EXPECT_EQ(outcome.output, "");
+        EXPECT_THAT(outcome.errors, AllOf(testing::StartsWith("tessaly-data: "), HasSubstr(says)));
+        EXPECT_EQ(std::count(outcome.errors.begin(), outcome.errors.end(), '\n'), 1)
+            << outcome.errors;
+        EXPECT_FALSE(fs::exists(scratch.path() / "out")) << arguments;
+    }
+    for (const char* asked : {"--help", "--version", "hrir --help"}) {
+        const Outcome outcome = run(asked);
+        EXPECT_EQ(outcome.code, 0) << asked;
+        EXPECT_NE(outcome.output, "") << asked;
+        EXPECT_EQ(outcome.errors, "") << asked;
+    }
 }
 
 TEST_F(Program, PlacesThatCannotBeWrittenToAreNamed) {
