@@ -1,4 +1,4 @@
-// Looks for the files that a scene needs, so that a missing one is told by name.
+// Looks at the files that a scene needs, so that a missing or damaged one is told by name.
 #pragma once
 
 #include <filesystem>
@@ -7,7 +7,12 @@
 
 namespace tessaly {
 
-/// @throws std::runtime_error with one line naming the first file that is missing
+/// Whether an engine asks for responses of 256 frames, by its settings or its quality step.
+bool usesLongResponses(const DirectEngine& engine) noexcept;
+
+/// Judges presence and size; of contents only headers are read.
+/// @throws std::runtime_error with one line naming the first file that is missing, damaged or of
+///         the wrong response length
 void checkData(const std::filesystem::path& directory, const Scene& scene);
 
 }  // namespace tessaly

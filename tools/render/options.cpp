@@ -30,7 +30,8 @@ RenderOptions parseOptions(int argumentCount,
         ->type_name("FILE");
     app.add_option("--sound", typed.sound, "Built-in sound: pluck, drums, bursts or speech")
         ->type_name("NAME");
-    app.add_option("--text", typed.text, "What speech says")->type_name("TEXT");
+    const CLI::Option* text =
+        app.add_option("--text", typed.text, "What speech says")->type_name("TEXT");
     app.add_option("--scene", typed.scenes,
                    "Scene file in place of one sound; may be repeated with --report")
         ->type_name("FILE.json")
@@ -119,6 +120,7 @@ RenderOptions parseOptions(int argumentCount,
     } catch (const CLI::ParseError& error) {
         throw UsageError(firstLine(error.what()));
     }
+    typed.textGiven = text->count() > 0;
     return optionsFromTexts(typed, defaultDataDirectory);
 }
 

@@ -8,11 +8,11 @@
 #include <algorithm>
 #include <cerrno>
 #include <cmath>
+#include <cstdio>
 #include <cstring>
-#include <fstream>
 #include <memory>
 #include <stdexcept>
-#include <vector>
+#include <utility>
 
 namespace tessaly {
 
@@ -20,6 +20,10 @@ namespace {
 
 struct CloseFile {
     void operator()(SNDFILE* file) const noexcept { sf_close(file); }
+};
+
+struct CloseStream {
+    void operator()(std::FILE* file) const noexcept { std::fclose(file); }
 };
 
 int soundFormat(SampleFormat format) {
@@ -69,6 +73,31 @@ void PendingFile::complete() {
     pending = false;
 }
 
+NewDirectory::NewDirectory(std::filesystem::path wanted) : place(std::move(wanted)) {
+    if (!place.has_filename()) {
+        place = place.parent_path();  // a slash at the end
+    }
+    std::error_code failure;
+    for (std::filesystem::path one = place; !one.empty() && !std::filesystem::exists(one, failure);
+         one = one.parent_path()) {
+        made.push_back(one);
+    }
+    std::filesystem::create_directories(place, failure);
+    if (failure || !std::filesystem::is_directory(place, failure)) {
+        removeEmpty();
+        throw cannotWrite(place, failure ? failure.message() : "it is no directory");
+    }
+}
+
+NewDirectory::~NewDirectory() { removeEmpty(); }
+
+void NewDirectory::removeEmpty() noexcept {
+    for (const std::filesystem::path& one : made) {
+        std::error_code ignored;
+        std::filesystem::remove(one, ignored);  // only if it is empty
+    }
+}
+
 std::size_t writeWav(const PendingFile& file,
                      std::span<const float> stereo,
                      int sampleRate,
@@ -80,7 +109,7 @@ std::size_t writeWav(const PendingFile& file,
     std::unique_ptr<SNDFILE, CloseFile> opened(
         sf_open(file.passingName().c_str(), SFM_WRITE, &info));
     if (!opened) {
-        throw cannotWrite(file.passingName(), sf_strerror(nullptr));
+        throw cannotWrite(file.finalName(), sf_strerror(nullptr));
     }
     // The peak chunk carries the time of writing: equal sounds would give different files.
     sf_command(opened.get(), SFC_SET_ADD_PEAK_CHUNK, nullptr, SF_FALSE);
@@ -92,22 +121,27 @@ std::size_t writeWav(const PendingFile& file,
                                                      [](float x) { return std::abs(x) > 1.0f; }));
     }
     const auto frames = static_cast<sf_count_t>(stereo.size() / 2);
+    errno = 0;
     const bool written = sf_writef_float(opened.get(), stereo.data(), frames) == frames;
     if (!written || sf_error(opened.get()) != SF_ERR_NO_ERROR) {
-        throw cannotWrite(file.passingName(), sf_strerror(opened.get()));
+        throw cannotWrite(file.finalName(),
+                          errno != 0 ? std::strerror(errno) : sf_strerror(opened.get()));
     }
     if (sf_close(opened.release()) != 0) {
-        throw cannotWrite(file.passingName(), "the file cannot be completed");
+        throw cannotWrite(file.finalName(),
+                          errno != 0 ? std::strerror(errno) : "the file cannot be completed");
     }
     return cut;
 }
 
 void writeText(const PendingFile& file, const std::string& text) {
-    std::ofstream stream(file.passingName(), std::ios::binary | std::ios::trunc);
-    stream << text;
-    stream.close();
-    if (!stream) {
-        throw cannotWrite(file.passingName(), "the text cannot be stored");
+    std::unique_ptr<std::FILE, CloseStream> stream(std::fopen(file.passingName().c_str(), "wb"));
+    if (!stream || std::fwrite(text.data(), 1, text.size(), stream.get()) != text.size() ||
+        std::fflush(stream.get()) != 0) {
+        throw cannotWrite(file.finalName(), std::strerror(errno));
+    }
+    if (std::fclose(stream.release()) != 0) {
+        throw cannotWrite(file.finalName(), std::strerror(errno));
     }
 }
 

@@ -4,6 +4,7 @@
 #include <filesystem>
 #include <span>
 #include <string>
+#include <vector>
 
 namespace tessaly {
 
@@ -19,6 +20,7 @@ public:
     PendingFile& operator=(const PendingFile&) = delete;
 
     const std::filesystem::path& passingName() const noexcept { return passing; }
+    const std::filesystem::path& finalName() const noexcept { return place; }
 
     /// Puts the file in its place, over an older one. @throws std::runtime_error
     void complete();
@@ -27,6 +29,23 @@ private:
     std::filesystem::path place;
     std::filesystem::path passing;
     bool pending = true;
+};
+
+/// A directory that is gone again, with those above it that it needed, if nothing came to lie in
+/// it.
+class NewDirectory {
+public:
+    /// @throws std::runtime_error with one line naming the directory
+    explicit NewDirectory(std::filesystem::path wanted);
+    ~NewDirectory();
+    NewDirectory(const NewDirectory&) = delete;
+    NewDirectory& operator=(const NewDirectory&) = delete;
+
+private:
+    void removeEmpty() noexcept;
+
+    std::filesystem::path place;
+    std::vector<std::filesystem::path> made;  // the innermost first
 };
 
 enum class SampleFormat { Float, Int16, Int24 };
@@ -40,7 +59,7 @@ std::size_t writeWav(const PendingFile& file,
                      int sampleRate,
                      SampleFormat format);
 
-/// Writes a text. @throws std::runtime_error
+/// Writes a text. @throws std::runtime_error with one line naming the place
 void writeText(const PendingFile& file, const std::string& text);
 
 }  // namespace tessaly

@@ -4,6 +4,7 @@
 #include <fmt/format.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <array>
 #include <cstdio>
 #include <filesystem>
@@ -59,10 +60,16 @@ void refuseToOverwrite(const std::filesystem::path& input, const std::filesystem
     }
 }
 
+// The file of the page, empty for none.
+std::filesystem::path pageOf(const RenderOptions& options) {
+    return options.report.empty() ? std::filesystem::path() : options.report / "index.html";
+}
+
 void refuseToOverwriteInputs(const std::filesystem::path& sceneFile,
                              const Scene& scene,
                              const RenderOptions& options) {
-    for (const std::filesystem::path& written : {options.output, options.report / "index.html"}) {
+    for (const std::filesystem::path& written :
+         {options.output, options.picture, pageOf(options)}) {
         refuseToOverwrite(sceneFile, written);
         for (const SceneSource& source : scene.sources) {
             refuseToOverwrite(source.input.file, written);
@@ -77,13 +84,36 @@ void openIfWanted(std::optional<PendingFile>& file, const std::filesystem::path&
 }
 
 std::string pageText(const RenderOptions& options) {
-    return options.report.empty() ? "" : ", page " + (options.report / "index.html").string();
+    return options.report.empty() ? "" : ", page " + pageOf(options).string();
+}
+
+// The page's place, taken before the work and given back if nothing comes of it.
+class PendingPage {
+public:
+    explicit PendingPage(const RenderOptions& options)
+        : directory(options.report), file(pageOf(options)) {}
+
+    void write(const Report& report) {
+        writeText(file, reportPage(report));
+        file.complete();
+    }
+
+private:
+    NewDirectory directory;
+    PendingFile file;
+};
+
+void openIfWanted(std::optional<PendingPage>& page, const RenderOptions& options) {
+    if (!options.report.empty()) {
+        page.emplace(options);
+    }
 }
 
 // The sound and picture of one rendering, and the page, in this order.
 void finish(const RenderOptions& options,
             std::optional<PendingFile>& sound,
             std::optional<PendingFile>& picture,
+            std::optional<PendingPage>& page,
             std::vector<Rendering>&& renderings,
             const std::string& remedy) {
     std::size_t cut = 0;
@@ -103,8 +133,8 @@ void finish(const RenderOptions& options,
     for (const Rendering& rendering : renderings) {
         warnings.push_back(rendering.result.warnings);
     }
-    if (!options.report.empty()) {
-        writeReport(reportOf(title, introduction, std::move(renderings)), options.report);
+    if (page) {
+        page->write(reportOf(title, introduction, std::move(renderings)));
     }
     if (picture) {
         picture->complete();
@@ -118,43 +148,30 @@ void finish(const RenderOptions& options,
     warnOfCut(cut, remedy);
 }
 
-// The directory for all rooms, gone again if nothing comes of it.
-class RoomDirectory {
-public:
-    explicit RoomDirectory(std::filesystem::path wanted) : place(std::move(wanted)) {
-        std::error_code failure;
-        made = std::filesystem::create_directories(place, failure);
-        if (failure || !std::filesystem::is_directory(place)) {
-            throw std::runtime_error(fmt::format("cannot write {}: {}", place.string(),
-                                                 failure ? failure.message() : "no directory"));
-        }
-    }
-    ~RoomDirectory() {
-        if (made) {
-            std::error_code ignored;
-            std::filesystem::remove(place, ignored);  // only if it is empty
-        }
-    }
-    RoomDirectory(const RoomDirectory&) = delete;
-    RoomDirectory& operator=(const RoomDirectory&) = delete;
-
-    /// "05_FamousConcerthall.wav": names without blanks.
-    std::filesystem::path file(int room, const char* extension) const {
-        std::string name = fmt::format("{:02}_{}{}", room, roomAt(room).name, extension);
-        std::replace(name.begin(), name.end(), ' ', '_');
-        return place / name;
-    }
-
-private:
-    std::filesystem::path place;
-    bool made = false;
-};
+// "05_FamousConcerthall.wav": names without blanks.
+std::filesystem::path roomFile(const std::filesystem::path& directory,
+                               int room,
+                               const char* extension) {
+    std::string name = fmt::format("{:02}_{}{}", room, roomAt(room).name, extension);
+    std::replace(name.begin(), name.end(), ' ', '_');
+    return directory / name;
+}
 
 // Files of one room.
 struct RoomFiles {
     std::optional<PendingFile> sound;
     std::optional<PendingFile> picture;
 };
+
+void openRoom(RoomFiles& files, const RenderOptions& options, int room) {
+    const std::filesystem::path sound = roomFile(options.output, room, ".wav");
+    const std::filesystem::path picture =
+        options.roomPictures ? roomFile(options.output, room, ".svg") : std::filesystem::path();
+    refuseToOverwrite(options.input, sound);
+    refuseToOverwrite(options.input, picture);
+    files.sound.emplace(sound);
+    openIfWanted(files.picture, picture);
+}
 
 Scene inRoom(const Scene& scene, int room) {
     Scene result = scene;
@@ -176,13 +193,15 @@ void renderOneSound(const RenderOptions& options) {
     std::optional<PendingFile> picture;
     openIfWanted(sound, options.output);
     openIfWanted(picture, options.picture);
+    std::optional<PendingPage> page;
+    openIfWanted(page, options);
     std::vector<Rendering> renderings(1);
     renderings[0].inputs = loadInputs(scene);
     const double duration = renderings[0].inputs.duration;
     settleOrbit(scene, options, duration);
     renderings[0].scene = scene;
     renderAll(options, renderings, [](std::size_t) {});
-    finish(options, sound, picture, std::move(renderings), "it, e.g. --set Gain=-6");
+    finish(options, sound, picture, page, std::move(renderings), "it, e.g. --set Gain=-6");
     tell(fmt::format("{}{:.1f} s{}{}", sound ? options.output.string() + ": " : "", duration,
                      picture ? ", picture " + options.picture.string() : "", pageText(options)));
 }
@@ -208,14 +227,16 @@ void renderScenes(const RenderOptions& options) {
     std::optional<PendingFile> sound;
     std::optional<PendingFile> noPicture;
     openIfWanted(sound, options.output);
+    std::optional<PendingPage> page;
+    openIfWanted(page, options);
     for (Rendering& rendering : renderings) {
         rendering.inputs = loadInputs(rendering.scene);
     }
     renderAll(options, renderings, [](std::size_t) {});
     const double duration = renderings[0].inputs.duration;
-    finish(options, sound, noPicture, std::move(renderings), "the sources' gain");
+    finish(options, sound, noPicture, page, std::move(renderings), "the sources' gain");
     tell(sound ? fmt::format("{}: {:.1f} s{}", options.output.string(), duration, pageText(options))
-               : "page " + (options.report / "index.html").string());
+               : "page " + pageOf(options).string());
 }
 
 void renderEveryRoom(const RenderOptions& options) {
@@ -226,15 +247,17 @@ void renderEveryRoom(const RenderOptions& options) {
         renderings[static_cast<std::size_t>(room)].scene = inRoom(scene, room);
         checkData(options.dataDirectory, renderings[static_cast<std::size_t>(room)].scene);
     }
-    const RoomDirectory directory(options.output);
+    refuseToOverwrite(options.input, pageOf(options));
+    std::optional<NewDirectory> directory;
     std::array<RoomFiles, roomCount> files;
-    for (int room = 0; room < roomCount; ++room) {
-        RoomFiles& one = files[static_cast<std::size_t>(room)];
-        refuseToOverwrite(options.input, directory.file(room, ".wav"));
-        one.sound.emplace(directory.file(room, ".wav"));
-        openIfWanted(one.picture,
-                     options.roomPictures ? directory.file(room, ".svg") : std::filesystem::path());
+    if (!options.output.empty()) {
+        directory.emplace(options.output);
+        for (int room = 0; room < roomCount; ++room) {
+            openRoom(files[static_cast<std::size_t>(room)], options, room);
+        }
     }
+    std::optional<PendingPage> page;
+    openIfWanted(page, options);
     const SceneInputs inputs = loadInputs(scene);
     settleOrbit(scene, options, inputs.duration);
     for (int room = 0; room < roomCount; ++room) {
@@ -246,8 +269,9 @@ void renderEveryRoom(const RenderOptions& options) {
     std::size_t cut = 0;
     renderAll(options, renderings, [&](std::size_t i) {
         Rendering& done = renderings[i];
-        const std::size_t here =
-            writeWav(*files[i].sound, done.result.stereo, done.scene.sampleRate, options.format);
+        const std::size_t here = files[i].sound ? writeWav(*files[i].sound, done.result.stereo,
+                                                           done.scene.sampleRate, options.format)
+                                                : 0;
         if (files[i].picture) {
             Scene titled = done.scene;
             titled.title = scene.title;
@@ -266,20 +290,22 @@ void renderEveryRoom(const RenderOptions& options) {
             warn(fmt::format("{}: {}", done.scene.title, line));
         }
     }
-    if (!options.report.empty()) {
+    if (page) {
         const std::string title =
             options.title.empty() ? scene.title + " in every room" : options.title;
-        writeReport(reportOf(title, introduction, std::move(renderings)), options.report);
+        page->write(reportOf(title, introduction, std::move(renderings)));
     }
     for (RoomFiles& one : files) {
         if (one.picture) {
             one.picture->complete();
         }
-        one.sound->complete();
+        if (one.sound) {
+            one.sound->complete();
+        }
     }
     warnOfCut(cut, "it, e.g. --set Gain=-6");
-    tell(fmt::format("{}: {} rooms, {:.1f} s each{}", options.output.string(), roomCount,
-                     inputs.duration, pageText(options)));
+    tell(fmt::format("{}{} rooms, {:.1f} s each{}", directory ? options.output.string() + ": " : "",
+                     roomCount, inputs.duration, pageText(options)));
 }
 
 void printListing(const RenderOptions& options) {

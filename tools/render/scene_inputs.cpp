@@ -1,8 +1,14 @@
 // Loading, cutting and looping of inputs.
 #include "render/scene_inputs.h"
 
+#include <fmt/format.h>
+
 #include <algorithm>
 #include <cmath>
+#include <cstdlib>
+#include <filesystem>
+#include <stdexcept>
+#include <string>
 
 #include "demo_sounds/demo_sounds.h"
 #include "demo_sounds/speech.h"
@@ -35,6 +41,30 @@ Sound builtIn(const SceneSource& source, const Scene& scene) {
     return sound;
 }
 
+// Where temporary files were looked for, in the order of the standard library; its error may not
+// say.
+std::string temporaryPlace() {
+    for (const char* variable : {"TMPDIR", "TMP", "TEMP", "TEMPDIR"}) {
+        const char* folder = std::getenv(variable);
+        if (folder != nullptr) {
+            return fmt::format("{} is {}: ", variable, folder);
+        }
+    }
+    return "";
+}
+
+// What goes wrong on the way to speech is said to be about speech.
+Sound spoken(const std::string& text, int sampleRate) {
+    try {
+        return makeSpeech(text, sampleRate);
+    } catch (const std::filesystem::filesystem_error& failure) {
+        throw std::runtime_error(fmt::format("speech needs a directory for a temporary file: {}{}",
+                                             temporaryPlace(), failure.code().message()));
+    } catch (const std::runtime_error& failure) {
+        throw std::runtime_error(fmt::format("no speech: {}", failure.what()));
+    }
+}
+
 Sound soundOf(const SceneSource& source, const Scene& scene) {
     const SceneInput& input = source.input;
     if (input.sound != "speech" && input.file.empty()) {
@@ -42,7 +72,7 @@ Sound soundOf(const SceneSource& source, const Scene& scene) {
     }
     const double limit = input.duration.value_or(longestScene);
     Sound sound = input.file.empty()
-                      ? makeSpeech(input.text, scene.sampleRate)
+                      ? spoken(input.text, scene.sampleRate)
                       : resampled(readSoundFile(input.file, limit), scene.sampleRate);
     const std::size_t most = framesOf(limit, scene.sampleRate);
     if (sound.frames() > most) {

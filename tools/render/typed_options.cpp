@@ -209,6 +209,18 @@ void checkSource(const RenderOptions& options) {
     }
 }
 
+void checkText(const RenderOptions& options, const TypedOptions& typed) {
+    if (!typed.textGiven) {
+        return;
+    }
+    if (options.sound != "speech") {
+        throw UsageError("--text has no meaning without --sound speech");
+    }
+    if (typed.text.find_first_not_of(" \t\r\n") == std::string::npos) {
+        throw UsageError("--text needs something to say");
+    }
+}
+
 bool endsIn(const std::filesystem::path& file, const char* extension) {
     return foldedName(file.extension().string()) == extension;
 }
@@ -240,13 +252,14 @@ void takePicture(RenderOptions& options, const TypedOptions& typed) {
 
 void checkOneSound(RenderOptions& options, const TypedOptions& typed) {
     checkSource(options);
+    checkText(options, typed);
     if (options.everyRoom) {
         refuse(typed.picture, "--picture", "--room all: each sound has its own");
-        if (typed.output.empty()) {
-            throw UsageError("no output given: -o DIR for all rooms");
+        if (typed.output.empty() && typed.report.empty()) {
+            throw UsageError("no output given: -o DIR for all rooms, or --report DIR");
         }
         options.output = typed.output;
-        options.roomPictures = !typed.noPicture;
+        options.roomPictures = !typed.noPicture && !typed.output.empty();
         return;
     }
     if (typed.output.empty() && typed.report.empty()) {
@@ -261,7 +274,6 @@ void checkScenes(RenderOptions& options, const TypedOptions& typed) {
     const std::pair<const std::string&, const char*> told[] = {
         {typed.input, "a sound file"},
         {typed.sound, "--sound"},
-        {typed.text, "--text"},
         {typed.at, "--at"},
         {typed.atXyz, "--at-xyz"},
         {typed.from, "--from"},
@@ -279,6 +291,7 @@ void checkScenes(RenderOptions& options, const TypedOptions& typed) {
     for (const auto& [text, option] : told) {
         refuse(text, option, "--scene: the file tells it");
     }
+    refuse(typed.textGiven ? "given" : "", "--text", "--scene: the file tells it");
     refuse(typed.orbit ? "given" : "", "--orbit", "--scene: the file tells it");
     refuse(typed.loop ? "given" : "", "--loop", "--scene: the file tells it");
     refuse(typed.settings.empty() ? "" : typed.settings.front(), "--set",

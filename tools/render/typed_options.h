@@ -14,6 +14,7 @@ struct TypedOptions {
     std::string input;
     std::string sound;
     std::string text;
+    bool textGiven = false;  ///< also if it is empty
     std::vector<std::string> scenes;
     std::string output;
     std::string report;

@@ -110,6 +110,10 @@ TEST(Options, EveryRoomGoesIntoADirectory) {
     EXPECT_TRUE(options.picture.empty());
     EXPECT_FALSE(parse({"in.wav", "--room", "All", "-o", "rooms", "--no-picture"}).roomPictures);
     EXPECT_FALSE(parseWith({"--room", "3"}).everyRoom);
+    const RenderOptions page = parse({"in.wav", "--room", "all", "--report", "page"});
+    EXPECT_TRUE(page.everyRoom);
+    EXPECT_TRUE(page.output.empty());
+    EXPECT_FALSE(page.roomPictures);
 }
 
 TEST(Options, APageCanStandInForTheSound) {
@@ -214,6 +218,8 @@ TEST(Options, RefusalsSayWhatIsWrong) {
         {{"in.wav"}, "either a sound file or --sound"},
         {{"--bogus"}, "--bogus"},
         {{"--rate"}, "--rate"},
+        {{"--text", "x"}, "--text has no meaning without --sound speech"},
+        {{"--text", ""}, "--text has no meaning without --sound speech"},
     };
     for (const Refusal& refusal : refusals) {
         const std::string failure = failureWith(refusal.words);
@@ -222,6 +228,14 @@ TEST(Options, RefusalsSayWhatIsWrong) {
     }
     EXPECT_THAT(failureOf({"--sound", "harp", "-o", "x.wav"}), HasSubstr("unknown sound \"harp\""));
     EXPECT_THAT(failureOf({"-o", "x.wav"}), HasSubstr("no sound given"));
+    EXPECT_THAT(failureOf({"in.wav", "-o", "x.wav", "--text", "x"}), HasSubstr("--sound speech"));
+    for (const char* text : {"", " \n"}) {
+        EXPECT_THAT(failureOf({"--sound", "speech", "-o", "x.wav", "--text", text}),
+                    HasSubstr("--text needs something to say"));
+    }
+    EXPECT_EQ(parse({"--sound", "speech", "-o", "x.wav", "--text", "Hello"}).text, "Hello");
+    EXPECT_THAT(failureOf({"--scene", "a.json", "-o", "x.wav", "--text", ""}),
+                HasSubstr("--text has no meaning for --scene"));
     EXPECT_THAT(failureOf({"in.wav"}), HasSubstr("no output given"));
     EXPECT_THAT(failureOf({"in.wav", "-o", "x.flac"}), HasSubstr("must end in .wav"));
     EXPECT_THAT(failureOf({"in.wav", "--room", "all"}), HasSubstr("-o DIR for all rooms"));

@@ -4,9 +4,12 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 #include <sndfile.h>
+#include <unistd.h>
 
 #include <fstream>
+#include <functional>
 #include <stdexcept>
+#include <string>
 
 #include "demo_sounds/sound_file.h"
 
@@ -68,6 +71,50 @@ TEST_F(OutputFile, UnwritablePlacesAreRefusedAtOnce) {
     };
     EXPECT_THAT(failureOf(folder / "missing" / "a.wav"), HasSubstr("cannot write"));
     EXPECT_THAT(failureOf(folder), HasSubstr("it is a directory"));
+}
+
+TEST_F(OutputFile, AFullDiskIsToldWithTheReasonAndTheFinalName) {
+    if (!std::filesystem::exists("/dev/full")) {
+        GTEST_SKIP() << "no device that is always full";
+    }
+    const std::filesystem::path place = folder / "a.out";
+    const auto failureOf = [&](const std::function<void(const PendingFile&)>& write) {
+        std::filesystem::create_symlink("/dev/full",
+                                        place.string() + ".part-" + std::to_string(getpid()));
+        try {
+            const PendingFile pending(place);
+            write(pending);
+        } catch (const std::runtime_error& error) {
+            return std::string(error.what());
+        }
+        return std::string();
+    };
+    for (const std::size_t length : {1u, 1000000u}) {
+        EXPECT_EQ(
+            failureOf([&](const PendingFile& file) { writeText(file, std::string(length, 'x')); }),
+            "cannot write " + place.string() + ": No space left on device");
+        EXPECT_EQ(filesInFolder(), 0u);
+    }
+    const std::string sound = failureOf([](const PendingFile& file) {
+        writeWav(file, std::vector<float>(100000), 48000, SampleFormat::Float);
+    });
+    EXPECT_THAT(sound, HasSubstr("cannot write " + place.string() + ": "));
+    EXPECT_EQ(filesInFolder(), 0u);
+}
+
+TEST_F(OutputFile, NewDirectoriesGoAgainUnlessSomethingLiesInThem) {
+    { const NewDirectory empty(folder / "a" / "b" / ""); }
+    EXPECT_EQ(filesInFolder(), 0u);
+    {
+        const NewDirectory used(folder / "a" / "b");
+        std::ofstream(folder / "a" / "b" / "file") << "x";
+    }
+    EXPECT_TRUE(std::filesystem::exists(folder / "a" / "b" / "file"));
+    std::filesystem::create_directory(folder / "old");
+    { const NewDirectory old(folder / "old"); }
+    EXPECT_TRUE(std::filesystem::exists(folder / "old")) << "it was there before";
+    EXPECT_THROW(NewDirectory(folder / "a" / "b" / "file" / "c"), std::runtime_error);
+    EXPECT_THROW(NewDirectory(folder / "a" / "b" / "file"), std::runtime_error);
 }
 
 TEST_F(OutputFile, FloatSamplesComeBackExactly) {

@@ -4,13 +4,16 @@
 
 #include <algorithm>
 #include <cmath>
+#include <cstdlib>
 #include <filesystem>
 #include <fstream>
 #include <sstream>
 
 #include "demo_sounds/sound_file.h"
+#include "demo_sounds/speech.h"
 #include "render/binaural_measures.h"
 #include "render/output_file.h"
+#include "tools/render/data_files.h"
 #include "tools/render/program_run.h"
 #include "tools/render/xml_check.h"
 
@@ -28,9 +31,8 @@ protected:
                  ("render_program_" + std::string(test->name()));
         std::filesystem::remove_all(folder);
         std::filesystem::create_directories(folder / "data");
-        for (const char* name : {"TSLdata120.dat", "TSLdata121.dat"}) {
-            std::ofstream(folder / "data" / name) << "data";
-        }
+        putResponses(folder / "data" / "TSLdata120.dat", 128);
+        putResponses(folder / "data" / "TSLdata121.dat", 139);
     }
     void TearDown() override { std::filesystem::remove_all(folder); }
 
@@ -107,7 +109,7 @@ TEST_F(RenderProgram, SourceOnTheRightReachesTheRightEarFirstAndLouder) {
 }
 
 TEST_F(RenderProgram, EveryRateAndBlockSizeGivesTheWholeDuration) {
-    std::ofstream(folder / "data" / "TSLdata122.dat") << "data";
+    putResponses(folder / "data" / "TSLdata122.dat", 70);
     for (const char* rate : {"24000", "44100", "48000"}) {
         for (const char* block : {"32", "1024", "4096"}) {
             ASSERT_EQ(render({"--rate", rate, "--block", block}).exitCode, 0);
@@ -215,6 +217,58 @@ TEST_F(RenderProgram, TheInputIsNeverTheOutput) {
     }
 }
 
+TEST_F(RenderProgram, TheInputIsNeverThePictureOrThePage) {
+    ASSERT_EQ(render({}).exitCode, 0);
+    std::filesystem::create_directory(folder / "page");
+    const std::string input = inFolder("page/index.html");
+    std::filesystem::rename(folder / "out.wav", input);
+    std::filesystem::create_symlink(input, folder / "link.svg");
+    const auto before = std::filesystem::file_size(input);
+    const std::vector<std::vector<std::string>> requests = {
+        {"-o", inFolder("new.wav"), "--picture", inFolder("link.svg")},
+        {"--report", inFolder("page")},
+        {"--report", inFolder("page"), "--room", "all"}};
+    putTails(folder / "data" / "TSLdata511.dat");
+    for (std::vector<std::string> request : requests) {
+        request.insert(request.begin(), {input, "--duration", "0.1"});
+        const ProgramRun refused = run(request);
+        EXPECT_EQ(refused.exitCode, 1);
+        EXPECT_THAT(refused.errors, HasSubstr("is the input and cannot be the output too"));
+        EXPECT_EQ(std::filesystem::file_size(input), before);
+        EXPECT_TRUE(std::filesystem::is_symlink(folder / "link.svg"));
+    }
+}
+
+TEST_F(RenderProgram, DamagedDataIsRefusedByName) {
+    std::filesystem::resize_file(folder / "data" / "TSLdata121.dat", 100000);
+    expectRefused(render({}), "TSLdata121.dat is damaged: 100000 bytes, expected 2804508");
+}
+
+TEST_F(RenderProgram, ATemporaryDirectoryThatIsMissingIsToldForWhat) {
+    const char* const set = std::getenv("TMPDIR");
+    const std::string before = set != nullptr ? set : "";
+    setenv("TMPDIR", "/nonexistent", 1);
+    const ProgramRun refused = run({"--sound", "speech", "-o", inFolder("out.wav")});
+    if (set != nullptr) {
+        setenv("TMPDIR", before.c_str(), 1);
+    } else {
+        unsetenv("TMPDIR");
+    }
+    EXPECT_EQ(refused.exitCode, 1);
+    expectRefused(refused, "speech");
+    if (speechAvailable()) {
+        EXPECT_THAT(
+            refused.errors,
+            HasSubstr("speech needs a directory for a temporary file: TMPDIR is /nonexistent: "));
+    }
+}
+
+TEST_F(RenderProgram, TextIsForSpeech) {
+    const ProgramRun refused = render({"--text", "Hello"});
+    expectRefused(refused, "--text has no meaning without --sound speech");
+    EXPECT_EQ(refused.exitCode, 2);
+}
+
 TEST_F(RenderProgram, MissingFilesAreRefusedInOneLine) {
     expectRefused(run({inFolder("none.wav"), "-o", inFolder("out.wav")}), "none.wav");
     expectRefused(run({inFolder("data/TSLdata120.dat"), "-o", inFolder("out.wav")}), "cannot read");
@@ -272,7 +326,7 @@ class SceneProgram : public RenderProgram {
 protected:
     void SetUp() override {
         RenderProgram::SetUp();
-        std::ofstream(folder / "data" / "TSLdata511.dat") << "data";
+        putTails(folder / "data" / "TSLdata511.dat");
     }
 
     std::string scene(const std::string& name, const std::string& text) const {
@@ -304,7 +358,7 @@ TEST_F(SceneProgram, AOneSourceSceneIsTheSameAsTheSingleSound) {
 }
 
 TEST_F(SceneProgram, RateAndBlockCanBeOverridden) {
-    std::ofstream(folder / "data" / "TSLdata122.dat") << "data";
+    putResponses(folder / "data" / "TSLdata122.dat", 70);
     const std::string file = scene("side.json", sideScene);
     ASSERT_EQ(run({"--scene", file, "-o", inFolder("out.wav"), "--rate", "24000", "--block", "64"})
                   .errors,
@@ -388,6 +442,24 @@ TEST_F(SceneProgram, EveryRoomHasASoundAndAPicture) {
         EXPECT_EQ(contentOf(folder / ("one" + std::string(extension))),
                   contentOf(folder / "rooms" / ("22_Small_Livingroom" + std::string(extension))));
     }
+}
+
+TEST_F(SceneProgram, EveryRoomOnAPageNeedsNoSoundFiles) {
+    ASSERT_EQ(run({"--sound", "bursts", "--duration", "0.05", "--room", "all", "--report",
+                   inFolder("page")})
+                  .errors,
+              "");
+    EXPECT_EQ(written(), std::vector<std::string>{"page"});
+    const std::filesystem::directory_iterator files(folder / "page");
+    EXPECT_EQ(std::distance(begin(files), end(files)), 1);
+    EXPECT_THAT(contentOf(folder / "page" / "index.html"),
+                AllOf(HasSubstr("00 dry"), HasSubstr("52 dry")));
+}
+
+TEST_F(SceneProgram, APageThatFailsLeavesNoDirectory) {
+    expectRefused(run({"--sound", "bursts", "--duration", "0.1", "--report", inFolder("new/page"),
+                       "--set", "Misbehave=2"}),
+                  "the library reports error -105");
 }
 
 TEST_F(SceneProgram, EveryRoomOrNone) {
