@@ -438,8 +438,7 @@ void convClass::accumulate() noexcept {
     const ComplexBin* const* const left = compensated ? &hpTFspectrumL : filterPartsL.data();
     const ComplexBin* const* const right = compensated ? &hpTFspectrumR : filterPartsR.data();
     const auto partitions = static_cast<std::size_t>(FDLtoBUFConv);
-    bool complete =
-        accumL != nullptr && accumR != nullptr && (isSecondInstance != 0 || hasSumMemory());
+    bool complete = accumL != nullptr && accumR != nullptr && hasSumMemory();
     for (std::size_t i = 0; i < partitions; ++i) {
         complete = complete && FDL[i] != nullptr && left[i] != nullptr && right[i] != nullptr;
     }

@@ -614,6 +614,33 @@ TEST_F(ConvClass, EveryFailedAllocationSetsItsCodeAndStaysHarmless) {
     EXPECT_EQ(failures, 21);
 }
 
+TEST_F(ConvClass, SeveralPartitionsSurviveEveryFailedAllocationInBothOrdersOfACrossfade) {
+    // Ring, filters left and right and six sums; the second instance: ring and six sums.
+    for (const std::int32_t heardOfOld : {-1, 8}) {
+        int failures = 0;
+        for (std::int32_t allowed = 0; allowed < 20; ++allowed) {
+            reset();
+            const LogCapture log;
+            ConvolverRig rig(16, 3);
+            rig.heardOfOld = heardOfOld;
+            spectralFaults.spectraLeft = allowed;
+            rig.makeBoth();
+            spectralFaults.spectraLeft = -1;
+            failures += essError == -202 ? 1 : 0;
+            std::ranges::fill(rig.filterLeft, 0.5f);
+            for (int n = 0; n < 6; ++n) {
+                rig.feed(std::vector<float>(16, 1.0f));
+                rig.run(n % 2 == 0);
+            }
+            // An instance that lacks memory for its sums is silent.
+            if (allowed < 9) {
+                EXPECT_THAT(rig.firstLeft, Each(0.0f)) << allowed;
+            }
+        }
+        EXPECT_EQ(failures, 16);
+    }
+}
+
 TEST_F(ConvClass, BadBlockLengthHasNoPlan) {
     for (const std::int32_t blockLength : {0, 1, 3, -4, 65536}) {
         reset();
