@@ -64,6 +64,12 @@ const PluginLibrary* library() {
     return opened.get();
 }
 
+void expectNoError(benchmark::State& state) {
+    if (library()->getErrorState() != 1) {
+        state.SkipWithError("the library reports a failure");
+    }
+}
+
 Played::Played(const char* effect, std::uint32_t blockLength)
     : frames_(blockLength),
       effect_(library()->effect(effect), sampleRate, blockLength),

@@ -1,6 +1,8 @@
 // A game for benchmarks: the built library with its data, and effects that are fed blocks.
 #pragma once
 
+#include <benchmark/benchmark.h>
+
 #include <cstdint>
 #include <vector>
 
@@ -16,6 +18,9 @@ inline constexpr int roomCount = 53;
 /// there is no data set. The set is looked for in the directory that the environment variable
 /// TESSALY_DATA names, else in "data" beside the build folder. Says once what is missing.
 const PluginLibrary* library();
+
+/// Fails a benchmark after which the library reports an error.
+void expectNoError(benchmark::State& state);
 
 /// One effect with its host buffers.
 class Played {

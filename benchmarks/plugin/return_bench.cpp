@@ -63,9 +63,7 @@ void sharedReturn(benchmark::State& state, bool alone, int sources, std::uint32_
         state.SetIterationTime(
             std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count());
     }
-    if (library()->getErrorState() != 1) {
-        state.SkipWithError("the library reports a failure");
-    }
+    expectNoError(state);
 }
 
 const bool registered = [] {

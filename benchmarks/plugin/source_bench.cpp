@@ -52,9 +52,7 @@ void source(benchmark::State& state, float room, Motion motion, std::uint32_t bl
         ++step;
         one.block();
     }
-    if (library()->getErrorState() != 1) {
-        state.SkipWithError("the library reports a failure");
-    }
+    expectNoError(state);
 }
 
 const bool registered = [] {

@@ -3,10 +3,6 @@
 
 #include <fmt/format.h>
 
-#include <stdexcept>
-#include <system_error>
-
-#include "render/output_file.h"
 #include "render/svg_canvas.h"
 #include "report/colour_scale.h"
 #include "report/entry_section.h"
@@ -54,18 +50,6 @@ std::string reportPage(const Report& report) {
         page += entrySection(report.entries[i], i);
     }
     return page + fmt::format("</main>\n<script>\n{}</script>\n</body>\n</html>\n", pageScript());
-}
-
-void writeReport(const Report& report, const std::filesystem::path& directory) {
-    std::error_code failure;
-    std::filesystem::create_directories(directory, failure);
-    if (failure) {
-        throw std::runtime_error("cannot write " + directory.string() + ": " + failure.message());
-    }
-    // An unwritable place is told before the work.
-    PendingFile file(directory / "index.html");
-    writeText(file, reportPage(report));
-    file.complete();
 }
 
 }  // namespace tessaly

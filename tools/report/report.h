@@ -1,7 +1,6 @@
 // The report: rendered sounds as one page that opens from disk.
 #pragma once
 
-#include <filesystem>
 #include <string>
 #include <vector>
 
@@ -52,9 +51,5 @@ struct Report {
 
 /// The whole page with sounds, pictures, style and script inside; refers to nothing outside.
 std::string reportPage(const Report& report);
-
-/// Writes DIR/index.html complete or not at all; makes the directory if need be.
-/// @throws std::runtime_error with one line
-void writeReport(const Report& report, const std::filesystem::path& directory);
 
 }  // namespace tessaly

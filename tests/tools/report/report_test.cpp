@@ -5,13 +5,11 @@
 #include <gtest/gtest.h>
 
 #include <cmath>
-#include <fstream>
 #include <limits>
 #include <regex>
 #include <sstream>
 #include <stdexcept>
 
-#include "tools/data/scratch_directory.h"
 #include "tools/report/sample_report.h"
 
 namespace tessaly {
@@ -184,34 +182,6 @@ TEST(ReportPage, EmptySoundHasNoPlayer) {
     const std::string page = reportPage(report);
     EXPECT_EQ(countOf(page, "<audio "), 0u);
     EXPECT_THAT(page, HasSubstr("There is no sound"));
-}
-
-TEST(WriteReport, MakesTheDirectoryAndLeavesOneFile) {
-    const data::ScratchDirectory scratch;
-    const std::filesystem::path directory = scratch.path() / "a" / "b";
-    const Report report = smallReport();
-    writeReport(report, directory);
-    std::ifstream stream(directory / "index.html", std::ios::binary);
-    std::stringstream text;
-    text << stream.rdbuf();
-    EXPECT_EQ(text.str(), reportPage(report));
-    EXPECT_EQ(std::distance(std::filesystem::directory_iterator(directory), {}), 1);
-}
-
-TEST(WriteReport, RefusesAPlaceThatIsNoDirectory) {
-    const data::ScratchDirectory scratch;
-    const std::filesystem::path file = scratch.path() / "file";
-    std::ofstream(file) << "text";
-    for (const std::filesystem::path& place : {file, file / "below"}) {
-        try {
-            writeReport(smallReport(), place);
-            FAIL() << place;
-        } catch (const std::runtime_error& failure) {
-            EXPECT_THAT(failure.what(), HasSubstr(place.string()));
-            EXPECT_THAT(failure.what(), Not(HasSubstr("\n")));
-        }
-    }
-    EXPECT_EQ(scratch.entryCount(), 1);
 }
 
 }  // namespace
