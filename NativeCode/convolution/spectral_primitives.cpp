@@ -1,6 +1,7 @@
 // The transform service and its reports, vector operations and the spectrum allocator.
 #include "convolution/spectral_primitives.h"
 
+#include <algorithm>
 #include <bit>
 #include <cstddef>
 #include <cstring>
@@ -111,9 +112,14 @@ std::int32_t commitTransform(const TransformHandle& handle) noexcept {
     return transformOk;
 }
 
-std::int32_t computeForward(const TransformHandle& handle,
-                            const float* input,
-                            ComplexBin* output) noexcept {
+namespace {
+
+/// Runs `transform` if the plan and both arrays are there. @return a status
+template <typename Input, typename Output, typename Transform>
+std::int32_t compute(const TransformHandle& handle,
+                     const Input* input,
+                     Output* output,
+                     Transform&& transform) noexcept {
     if (handle == nullptr) {
         return transformEmptyHandle;
     }
@@ -123,24 +129,62 @@ std::int32_t computeForward(const TransformHandle& handle,
     if (input == nullptr || output == nullptr) {
         return transformNullArray;
     }
-    handle->kernels.forward(*handle->tables, input, output, handle->work.data());
+    transform(handle->kernels, *handle->tables, handle->work.data());
     return transformOk;
+}
+
+std::int32_t reportForward(std::int32_t status) noexcept {
+    if (status != transformOk) {
+        logOutput("Tessaly ERROR: FFT not working! status ", status, ' ', transformMessage(status));
+    }
+    return status;
+}
+
+std::int32_t reportBackward(std::int32_t status) noexcept {
+    if (status != transformOk) {
+        logTrace("Tessaly ERROR: IFFT not working! status ", status, ' ', transformMessage(status));
+    }
+    return status;
+}
+
+}  // namespace
+
+std::int32_t computeForward(const TransformHandle& handle,
+                            const float* input,
+                            ComplexBin* output) noexcept {
+    return compute(handle, input, output,
+                   [&](const Kernels& kernels, const auto& tables, float* work) {
+                       kernels.forward(tables, input, output, work);
+                   });
+}
+
+std::int32_t computeForwardHalf(const TransformHandle& handle,
+                                const float* input,
+                                ComplexBin* output) noexcept {
+    return compute(handle, input, output,
+                   [&](const Kernels& kernels, const auto& tables, float* work) {
+                       kernels.forwardHalf(tables, input, output, work);
+                   });
 }
 
 std::int32_t computeBackward(const TransformHandle& handle,
                              const ComplexBin* input,
                              float* output) noexcept {
-    if (handle == nullptr) {
-        return transformEmptyHandle;
-    }
-    if (!handle->committed) {
-        return transformNotCommitted;
-    }
-    if (input == nullptr || output == nullptr) {
-        return transformNullArray;
-    }
-    handle->kernels.backward(*handle->tables, input, output, handle->work.data());
-    return transformOk;
+    return compute(handle, input, output,
+                   [&](const Kernels& kernels, const auto& tables, float* work) {
+                       kernels.backward(tables, input, output, work);
+                   });
+}
+
+std::int32_t computeBackwardMiddle(const TransformHandle& handle,
+                                   const ComplexBin* input,
+                                   float* output,
+                                   std::int32_t samples) noexcept {
+    return compute(
+        handle, input, output, [&](const Kernels& kernels, const auto& tables, float* work) {
+            const auto wanted = static_cast<std::size_t>(std::clamp(samples, 0, tables.points));
+            kernels.backwardMiddle(tables, input, output, work, wanted);
+        });
 }
 
 std::int32_t createFFT(TransformHandle& handle, std::int32_t length) noexcept {
@@ -165,19 +209,24 @@ std::int32_t createFFT(TransformHandle& handle, std::int32_t length) noexcept {
 }
 
 std::int32_t FFT(const float* input, ComplexBin* output, const TransformHandle& handle) noexcept {
-    const std::int32_t status = computeForward(handle, input, output);
-    if (status != transformOk) {
-        logOutput("Tessaly ERROR: FFT not working! status ", status, ' ', transformMessage(status));
-    }
-    return status;
+    return reportForward(computeForward(handle, input, output));
+}
+
+std::int32_t halfFFT(const float* input,
+                     ComplexBin* output,
+                     const TransformHandle& handle) noexcept {
+    return reportForward(computeForwardHalf(handle, input, output));
 }
 
 std::int32_t IFFT(const ComplexBin* input, float* output, const TransformHandle& handle) noexcept {
-    const std::int32_t status = computeBackward(handle, input, output);
-    if (status != transformOk) {
-        logTrace("Tessaly ERROR: IFFT not working! status ", status, ' ', transformMessage(status));
-    }
-    return status;
+    return reportBackward(computeBackward(handle, input, output));
+}
+
+std::int32_t middleIFFT(const ComplexBin* input,
+                        float* output,
+                        std::int32_t samples,
+                        const TransformHandle& handle) noexcept {
+    return reportBackward(computeBackwardMiddle(handle, input, output, samples));
 }
 
 void allocSpectrum(ComplexBin*& slot, std::int32_t count) noexcept {

@@ -48,11 +48,21 @@ std::int32_t commitTransform(const TransformHandle& handle) noexcept;
 std::int32_t computeForward(const TransformHandle& handle,
                             const float* input,
                             ComplexBin* output) noexcept TESSALY_NONBLOCKING;
+/// As computeForward, of B reals that B zeros follow; the zeros are not read. Block time.
+std::int32_t computeForwardHalf(const TransformHandle& handle,
+                                const float* input,
+                                ComplexBin* output) noexcept TESSALY_NONBLOCKING;
 /// B+1 bins to 2B reals, e^(+i...), no scale factor: forward and backward multiply by 2B. The
 /// imaginary parts of bins 0 and B are ignored; the arrays must not overlap. Block time.
 std::int32_t computeBackward(const TransformHandle& handle,
                              const ComplexBin* input,
                              float* output) noexcept TESSALY_NONBLOCKING;
+/// As computeBackward, of which only samples B to B + `samples` - 1 are wanted: `output` holds 2B
+/// floats all the same, and the others are undefined. Block time.
+std::int32_t computeBackwardMiddle(const TransformHandle& handle,
+                                   const ComplexBin* input,
+                                   float* output,
+                                   std::int32_t samples) noexcept TESSALY_NONBLOCKING;
 
 /// Creates, sets and commits a plan for `length` real samples. A failing step writes a trace line
 /// and the next one runs all the same. Load time: allocates.
@@ -61,8 +71,18 @@ std::int32_t createFFT(TransformHandle& handle, std::int32_t length) noexcept;
 /// Forward transform; a refusal is a line on the standard output log and leaves `output` as it
 /// was. Block time, but for that line.
 std::int32_t FFT(const float* input, ComplexBin* output, const TransformHandle& handle) noexcept;
+/// Forward transform of B samples and B zeros; likewise. Block time.
+std::int32_t halfFFT(const float* input,
+                     ComplexBin* output,
+                     const TransformHandle& handle) noexcept;
 /// Backward transform; a refusal is a trace line and leaves `output` as it was. Block time.
 std::int32_t IFFT(const ComplexBin* input, float* output, const TransformHandle& handle) noexcept;
+/// Backward transform of which only samples B to B + `samples` - 1 are wanted; likewise. Block
+/// time.
+std::int32_t middleIFFT(const ComplexBin* input,
+                        float* output,
+                        std::int32_t samples,
+                        const TransformHandle& handle) noexcept;
 
 /// Fills `slot` with `count` zeroed bins on a 64-byte boundary; load time. On failure (no memory,
 /// or a count below 1) the slot is null, `essError` is -202 and a trace line tells.

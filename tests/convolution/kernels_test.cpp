@@ -130,6 +130,54 @@ TEST_P(KernelTable, RingSumEqualsPlainPassesWithinItsBound) {
     }
 }
 
+TEST_P(KernelTable, ListSumEqualsPlainPassesAndAddsOntoASum) {
+    for (const std::size_t count : {0u, 1u, 2u, 3u, 4u, 5u, 8u, 11u}) {
+        for (const std::size_t bins : lengths) {
+            Noise noise(static_cast<std::uint32_t>(bins * 100 + count));
+            std::vector<std::vector<ComplexBin>> storage;
+            storage.reserve(3 * count);
+            const auto pointers = [&] {
+                std::vector<const ComplexBin*> entries;
+                for (std::size_t i = 0; i < count; ++i) {
+                    storage.push_back(noise.bins(bins));
+                    entries.push_back(storage.back().data());
+                }
+                return entries;
+            };
+            const std::vector<const ComplexBin*> input = pointers();
+            const std::vector<const ComplexBin*> left = pointers();
+            const std::vector<const ComplexBin*> right = pointers();
+            const std::vector<ComplexBin> start = noise.bins(bins);
+            for (const bool onto : {false, true}) {
+                std::vector<ComplexBin> sumL = start;
+                std::vector<ComplexBin> sumR = start;
+                sumL.push_back({99.0f, 99.0f});
+                sumR.push_back({99.0f, 99.0f});
+                GetParam()->listSum(bins, count, input.data(), left.data(), right.data(), onto,
+                                    sumL.data(), sumR.data());
+                const float bound = 4.0f * static_cast<float>((count + 1) * (count + 2)) * 0x1p-24f;
+                const auto compare = [&](const std::vector<const ComplexBin*>& response,
+                                         const std::vector<ComplexBin>& got) {
+                    std::vector<ComplexBin> expected =
+                        onto || count == 0 ? start : std::vector<ComplexBin>(bins);
+                    std::vector<ComplexBin> scratch(bins);
+                    for (std::size_t n = 0; n < count; ++n) {
+                        plainMultiply(bins, input[n], response[n], scratch.data());
+                        plainAdd(bins, scratch.data(), expected.data(), expected.data());
+                    }
+                    for (std::size_t i = 0; i < bins; ++i) {
+                        ASSERT_NEAR(got[i].re, expected[i].re, bound) << count << ' ' << bins;
+                        ASSERT_NEAR(got[i].im, expected[i].im, bound) << count << ' ' << bins;
+                    }
+                    EXPECT_EQ(got.back().re, 99.0f);
+                };
+                compare(left, sumL);
+                compare(right, sumR);
+            }
+        }
+    }
+}
+
 INSTANTIATE_TEST_SUITE_P(Tables, KernelTable, testing::ValuesIn(testableKernels()), kernelTestName);
 
 TEST(KernelDispatch, OffersThePlainTableFirstAndTakesTheLast) {
@@ -154,10 +202,13 @@ TEST(KernelDispatch, EveryTableIsComplete) {
     for (const Kernels* kernels : testableKernels()) {
         EXPECT_NE(kernels->transformLanes, nullptr);
         EXPECT_NE(kernels->forward, nullptr);
+        EXPECT_NE(kernels->forwardHalf, nullptr);
         EXPECT_NE(kernels->backward, nullptr);
+        EXPECT_NE(kernels->backwardMiddle, nullptr);
         EXPECT_NE(kernels->multiply, nullptr);
         EXPECT_NE(kernels->add, nullptr);
         EXPECT_NE(kernels->ringSum, nullptr);
+        EXPECT_NE(kernels->listSum, nullptr);
         for (std::int32_t points = 2; points <= 32768; points *= 2) {
             const std::int32_t lanes = kernels->transformLanes(points);
             EXPECT_LE(lanes * lanes, points) << kernels->name;

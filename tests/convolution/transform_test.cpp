@@ -2,6 +2,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <bit>
 #include <cmath>
 
@@ -160,6 +161,60 @@ TEST_P(Transform, BackwardIgnoresImaginaryPartsOfFirstAndLastBin) {
         IFFT(bins.data(), ignored.data(), handle);
         EXPECT_EQ(clean, ignored) << length;
     }
+}
+
+TEST_P(Transform, OfAHalfThatZerosFollowEqualsTheWholeOne) {
+    for (std::size_t length = 4; length <= 16384; length *= 2) {
+        SCOPED_TRACE(length);
+        const TransformHandle handle = plan(length);
+        std::vector<float> input = Noise(3).samples(length);
+        std::fill(input.begin() + static_cast<std::ptrdiff_t>(length / 2), input.end(), 0.0f);
+        const std::vector<float> half(input.begin(),
+                                      input.begin() + static_cast<std::ptrdiff_t>(length / 2));
+        std::vector<ComplexBin> expected(length / 2 + 1);
+        std::vector<ComplexBin> got(length / 2 + 1);
+        ASSERT_EQ(FFT(input.data(), expected.data(), handle), transformOk);
+        ASSERT_EQ(halfFFT(half.data(), got.data(), handle), transformOk);
+        for (std::size_t k = 0; k < got.size(); ++k) {
+            ASSERT_EQ(got[k].re, expected[k].re) << k;
+            ASSERT_EQ(got[k].im, expected[k].im) << k;
+        }
+    }
+}
+
+TEST_P(Transform, OfTheMiddleEqualsThatPartOfTheWholeOne) {
+    for (std::size_t length = 4; length <= 16384; length *= 2) {
+        for (const std::size_t samples : {std::size_t{1}, std::size_t{16}, std::size_t{64},
+                                          std::size_t{200}, length / 2, length}) {
+            SCOPED_TRACE(length);
+            SCOPED_TRACE(samples);
+            const TransformHandle handle = plan(length);
+            const std::vector<ComplexBin> bins = Noise(4).bins(length / 2 + 1);
+            std::vector<float> expected(length);
+            std::vector<float> got(length + 1, 99.0f);
+            ASSERT_EQ(IFFT(bins.data(), expected.data(), handle), transformOk);
+            ASSERT_EQ(
+                middleIFFT(bins.data(), got.data(), static_cast<std::int32_t>(samples), handle),
+                transformOk);
+            for (std::size_t i = 0; i < std::min(samples, length / 2); ++i) {
+                ASSERT_EQ(got[length / 2 + i], expected[length / 2 + i]) << i;
+            }
+            EXPECT_EQ(got.back(), 99.0f);
+        }
+    }
+}
+
+TEST_P(Transform, OfAHalfAndOfTheMiddleAreRefusedAsTheWholeOnes) {
+    std::vector<float> samples(16);
+    std::vector<ComplexBin> bins(9);
+    EXPECT_EQ(computeForwardHalf(nullptr, samples.data(), bins.data()), transformEmptyHandle);
+    EXPECT_EQ(computeBackwardMiddle(nullptr, bins.data(), samples.data(), 4), transformEmptyHandle);
+    const TransformHandle handle = plan(16);
+    EXPECT_EQ(computeForwardHalf(handle, nullptr, bins.data()), transformNullArray);
+    EXPECT_EQ(computeForwardHalf(handle, samples.data(), nullptr), transformNullArray);
+    EXPECT_EQ(computeBackwardMiddle(handle, nullptr, samples.data(), 4), transformNullArray);
+    EXPECT_EQ(computeBackwardMiddle(handle, bins.data(), nullptr, 4), transformNullArray);
+    EXPECT_EQ(computeBackwardMiddle(handle, bins.data(), samples.data(), -1), transformOk);
 }
 
 INSTANTIATE_TEST_SUITE_P(Tables, Transform, testing::ValuesIn(testableKernels()), kernelTestName);

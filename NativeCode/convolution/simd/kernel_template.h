@@ -193,6 +193,25 @@ struct SampleSource {
     }
 };
 
+/// As SampleSource, of M samples that M zeros follow.
+template <class Lanes>
+struct HalfSource {
+    const float* samples;
+    Index half;  // groups that hold samples
+
+    TESSALY_KERNEL_INLINE Complex<Lanes> operator()(Index j) const {
+        Complex<Lanes> value{Lanes::broadcast(0.0f), Lanes::broadcast(0.0f)};
+        if (j < half) {
+            Lanes::loadInterleaved(samples + 2 * Lanes::count * j, value.re, value.im);
+        }
+        return value;
+    }
+};
+template <class Source>
+inline constexpr bool secondHalfIsZero = false;
+template <class Lanes>
+inline constexpr bool secondHalfIsZero<HalfSource<Lanes>> = true;
+
 template <class Lanes>
 struct GroupSource {
     const float* groups;
@@ -264,9 +283,19 @@ void pass4(const Source& source, float* out, Index n, Index stride, const float*
             const Index to = q + stride * 4 * p;
             Complex<Lanes> a = source(from);
             Complex<Lanes> b = source(from + step);
-            Complex<Lanes> c = source(from + 2 * step);
-            Complex<Lanes> d = source(from + 3 * step);
-            transform4(a, b, c, d);
+            Complex<Lanes> c{};
+            Complex<Lanes> d{};
+            if constexpr (secondHalfIsZero<Source>) {
+                c = a - b;
+                d = plusITimes(a, b);
+                const Complex<Lanes> second = minusITimes(a, b);
+                a = a + b;
+                b = second;
+            } else {
+                c = source(from + 2 * step);
+                d = source(from + 3 * step);
+                transform4(a, b, c, d);
+            }
             storeGroup(out, to, a);
             storeGroup(out, to + stride, b * root1);
             storeGroup(out, to + 2 * stride, c * root2);
@@ -321,8 +350,46 @@ void lastPass8(const Source& source, float* out, Index stride) {
     }
 }
 
+/// Rows of the result that are wanted: all of them, or those below `end` at least.
+struct WantedRows {
+    Index end;
+
+    Index rows(Index stride) const { return (end + stride - 1) / stride; }
+    Index within(Index stride) const { return end < stride ? end : stride; }
+};
+
+/// The last pass without the rows that nobody wants.
+template <class Lanes, Index Rows, class Source>
+void lastPass8Rows(const Source& source, float* out, Index stride, Index within) {
+    for (Index q = 0; q < within; ++q) {
+        Complex<Lanes> x[8] = {source(q),
+                               source(q + stride),
+                               source(q + 2 * stride),
+                               source(q + 3 * stride),
+                               source(q + 4 * stride),
+                               source(q + 5 * stride),
+                               source(q + 6 * stride),
+                               source(q + 7 * stride)};
+        transform8(x);
+        TESSALY_KERNEL_UNROLL
+        for (Index r = 0; r < Rows; ++r) {
+            storeGroup(out, q + r * stride, x[r]);
+        }
+    }
+}
+
 template <class Lanes, class Source>
-void lastPass(const Source& source, float* out, Index n, Index stride) {
+void lastPass(const Source& source, float* out, Index n, Index stride, WantedRows wanted) {
+    const Index rows = wanted.rows(stride);
+    if (n == 8 && rows <= 1) {
+        return lastPass8Rows<Lanes, 1>(source, out, stride, wanted.within(stride));
+    }
+    if (n == 8 && rows <= 2) {
+        return lastPass8Rows<Lanes, 2>(source, out, stride, stride);
+    }
+    if (n == 8 && rows <= 4) {
+        return lastPass8Rows<Lanes, 4>(source, out, stride, stride);
+    }
     if (n == 8) {
         lastPass8<Lanes>(source, out, stride);
     } else if (n == 4) {
@@ -332,12 +399,14 @@ void lastPass(const Source& source, float* out, Index n, Index stride) {
     }
 }
 
-/// Transforms all columns; passes go to and fro between two buffers and end in `result`.
+/// Transforms all columns; passes go to and fro between two buffers and end in `result`. Rows that
+/// are not wanted may be left out.
 template <class Lanes, class Source>
 void transformColumns(const TransformTables& tables,
                       const Source& source,
                       float* result,
-                      float* other) {
+                      float* other,
+                      WantedRows wanted) {
     Index passes = 1;
     for (Index rest = tables.columns; rest > 8; rest /= 4) {
         ++passes;
@@ -345,7 +414,7 @@ void transformColumns(const TransformTables& tables,
     float* out = passes % 2 == 1 ? result : other;
     Index n = tables.columns;
     if (n <= 8) {
-        lastPass<Lanes>(source, out, n, 1);
+        lastPass<Lanes>(source, out, n, 1, wanted);
         return;
     }
     const float* roots = tables.passes;
@@ -363,7 +432,7 @@ void transformColumns(const TransformTables& tables,
         out = in;
         in = written;
     }
-    lastPass<Lanes>(GroupSource<Lanes>{in}, out, n, stride);
+    lastPass<Lanes>(GroupSource<Lanes>{in}, out, n, stride, wanted);
 }
 
 // ---- The pass across the lanes ----
@@ -391,6 +460,43 @@ struct SampleSink {
     }
 };
 
+/// Transforms across the lanes, L rows at a time: sink(k0, x) gets rows k0 + columns * d as x[d].
+template <class Lanes, class Sink>
+TESSALY_KERNEL_INLINE void acrossRows(const TransformTables& tables,
+                                      const float* in,
+                                      Index groups,
+                                      const Sink& sink) {
+    constexpr Index count = Lanes::count;
+    const float* roots = tables.across;
+    for (Index k0 = 0; k0 < groups * count; k0 += count) {
+        typename Lanes::Vector re[count];
+        typename Lanes::Vector im[count];
+        TESSALY_KERNEL_UNROLL
+        for (Index j = 0; j < count; ++j) {
+            const Complex<Lanes> value = loadGroup<Lanes>(in, k0 + j);
+            re[j] = value.re;
+            im[j] = value.im;
+        }
+        Lanes::transpose(re);
+        Lanes::transpose(im);
+        Complex<Lanes> x[count];
+        x[0] = {re[0], im[0]};
+        TESSALY_KERNEL_UNROLL
+        for (Index c = 1; c < count; ++c) {
+            x[c] = Complex<Lanes>{re[c], im[c]} * loadGroup<Lanes>(roots, c - 1);
+        }
+        roots += 2 * count * (count - 1);
+        if constexpr (count == 4) {
+            transform4(x[0], x[1], x[2], x[3]);
+        } else if constexpr (count == 8) {
+            transform8(x);
+        } else {
+            transform16(x);
+        }
+        sink(k0, x);
+    }
+}
+
 template <class Lanes, class Sink>
 void transformAcross(const TransformTables& tables, const float* in, const Sink& sink) {
     constexpr Index count = Lanes::count;
@@ -400,53 +506,29 @@ void transformAcross(const TransformTables& tables, const float* in, const Sink&
             sink(k, loadGroup<Lanes>(in, k));
         }
     } else {
-        const float* roots = tables.across;
-        for (Index k0 = 0; k0 < columns; k0 += count) {
-            typename Lanes::Vector re[count];
-            typename Lanes::Vector im[count];
-            TESSALY_KERNEL_UNROLL
-            for (Index j = 0; j < count; ++j) {
-                const Complex<Lanes> value = loadGroup<Lanes>(in, k0 + j);
-                re[j] = value.re;
-                im[j] = value.im;
-            }
-            Lanes::transpose(re);
-            Lanes::transpose(im);
-            Complex<Lanes> x[count];
-            x[0] = {re[0], im[0]};
-            TESSALY_KERNEL_UNROLL
-            for (Index c = 1; c < count; ++c) {
-                x[c] = Complex<Lanes>{re[c], im[c]} * loadGroup<Lanes>(roots, c - 1);
-            }
-            roots += 2 * count * (count - 1);
-            if constexpr (count == 4) {
-                transform4(x[0], x[1], x[2], x[3]);
-            } else if constexpr (count == 8) {
-                transform8(x);
-            } else {
-                transform16(x);
-            }
-            TESSALY_KERNEL_UNROLL
-            for (Index d = 0; d < count; ++d) {
-                sink(k0 + columns * d, x[d]);
-            }
-        }
+        acrossRows<Lanes>(tables, in, columns / count,
+                          [&](Index k0, const Complex<Lanes>(&x)[count]) {
+                              TESSALY_KERNEL_UNROLL
+                              for (Index d = 0; d < count; ++d) {
+                                  sink(k0 + columns * d, x[d]);
+                              }
+                          });
     }
 }
 
 // ---- The real transform ----
 
-template <class Lanes>
-void forwardLanes(const TransformTables& tables,
-                  const float* input,
-                  ComplexBin* bins,
-                  float* work) {
+template <class Lanes, class Source>
+void forwardFrom(const TransformTables& tables,
+                 const Source& source,
+                 ComplexBin* bins,
+                 float* work) {
     constexpr Index count = Lanes::count;
     const Index points = tables.points;
     float* out = floats(bins);
     float* re = work;
     float* im = work + points + 16;
-    transformColumns<Lanes>(tables, SampleSource<Lanes>{input}, out, work);
+    transformColumns<Lanes>(tables, source, out, work, WantedRows{tables.columns});
     transformAcross<Lanes>(tables, out, SplitSink<Lanes>{re, im});
     re[points] = re[0];
     im[points] = im[0];
@@ -473,12 +555,62 @@ void forwardLanes(const TransformTables& tables,
 }
 
 template <class Lanes>
+void forwardLanes(const TransformTables& tables,
+                  const float* input,
+                  ComplexBin* bins,
+                  float* work) {
+    forwardFrom<Lanes>(tables, SampleSource<Lanes>{input}, bins, work);
+}
+
+template <class Lanes>
+void forwardHalfLanes(const TransformTables& tables,
+                      const float* input,
+                      ComplexBin* bins,
+                      float* work) {
+    const Index groups = tables.columns;
+    if (groups < 2) {
+        // A single group holds all of the points: there is no half of groups to leave out.
+        float padded[4 * Lanes::count]{};
+        for (Index i = 0; i < tables.points; ++i) {
+            padded[i] = input[i];
+        }
+        return forwardLanes<Lanes>(tables, padded, bins, work);
+    }
+    forwardFrom<Lanes>(tables, HalfSource<Lanes>{input, groups / 2}, bins, work);
+}
+
+template <class Lanes>
 void backwardLanes(const TransformTables& tables,
                    const ComplexBin* bins,
                    float* output,
                    float* work) {
-    transformColumns<Lanes>(tables, BinSource<Lanes>(tables, bins), work, output);
+    transformColumns<Lanes>(tables, BinSource<Lanes>(tables, bins), work, output,
+                            WantedRows{tables.columns});
     transformAcross<Lanes>(tables, work, SampleSink<Lanes>{output});
+}
+
+/// The samples from the middle on are those that the middle lane of the pass across gives, from the
+/// first row on: the other lanes and the other rows are left out.
+template <class Lanes>
+void backwardMiddleLanes(const TransformTables& tables,
+                         const ComplexBin* bins,
+                         float* output,
+                         float* work,
+                         std::size_t samples) {
+    constexpr Index count = Lanes::count;
+    const Index rows = (static_cast<Index>(samples) + 1) / 2;
+    if (count == 1 || rows > tables.columns) {
+        return backwardLanes<Lanes>(tables, bins, output, work);
+    }
+    if constexpr (count > 1) {
+        transformColumns<Lanes>(tables, BinSource<Lanes>(tables, bins), work, output,
+                                WantedRows{rows});
+        const Index middle = tables.points;
+        acrossRows<Lanes>(tables, work, (rows + count - 1) / count,
+                          [&](Index k0, const Complex<Lanes>(&x)[count]) {
+                              SampleSink<Lanes>{output + middle}(k0, x[count / 2]);
+                          });
+    }
 }
 
 // ---- Operations on bins ----
@@ -577,6 +709,41 @@ void sumGroup(std::size_t bins,
 
 /// Partitions are taken four at a time: twelve streams of memory keep the prefetchers busy, and
 /// the sums, which stay in the nearest cache, are touched once for four products.
+/// @param next  gives the pointers of one product after the other
+template <class Lanes, class Next>
+TESSALY_KERNEL_INLINE void sumProducts(std::size_t bins,
+                                       std::size_t count,
+                                       bool onto,
+                                       const Next& next,
+                                       ComplexBin* sumL,
+                                       ComplexBin* sumR) {
+    constexpr int group = 4;
+    const auto take = [&]<int Group, bool Start>() {
+        const ComplexBin* x[Group];
+        const ComplexBin* l[Group];
+        const ComplexBin* r[Group];
+        TESSALY_KERNEL_UNROLL
+        for (int g = 0; g < Group; ++g) {
+            next(x[g], l[g], r[g]);
+        }
+        sumGroup<Lanes, Group, Start>(bins, x, l, r, sumL, sumR);
+    };
+    std::size_t done = 0;
+    if (!onto && count >= group) {
+        take.template operator()<group, true>();
+        done = group;
+    } else if (!onto && count > 0) {
+        take.template operator()<1, true>();
+        done = 1;
+    }
+    for (; done + group <= count; done += group) {
+        take.template operator()<group, false>();
+    }
+    for (; done < count; ++done) {
+        take.template operator()<1, false>();
+    }
+}
+
 template <class Lanes>
 void sumRing(std::size_t bins,
              std::size_t partitions,
@@ -586,40 +753,35 @@ void sumRing(std::size_t bins,
              const ComplexBin* const* right,
              ComplexBin* sumL,
              ComplexBin* sumR) {
-    constexpr int group = 4;
     std::size_t slot = newest;
     std::size_t part = 0;
-    const auto advance = [&slot, &part, partitions] {
+    const auto next = [&](const ComplexBin*& x, const ComplexBin*& l, const ComplexBin*& r) {
+        x = ring[slot];
+        l = left[part];
+        r = right[part];
         slot = slot + 1 == partitions ? 0 : slot + 1;
         part = part == 0 ? partitions - 1 : part - 1;
     };
-    const auto take = [&]<int Group, bool Start>() {
-        const ComplexBin* x[Group];
-        const ComplexBin* l[Group];
-        const ComplexBin* r[Group];
-        TESSALY_KERNEL_UNROLL
-        for (int g = 0; g < Group; ++g) {
-            x[g] = ring[slot];
-            l[g] = left[part];
-            r[g] = right[part];
-            advance();
-        }
-        sumGroup<Lanes, Group, Start>(bins, x, l, r, sumL, sumR);
+    sumProducts<Lanes>(bins, partitions, false, next, sumL, sumR);
+}
+
+template <class Lanes>
+void sumList(std::size_t bins,
+             std::size_t count,
+             const ComplexBin* const* input,
+             const ComplexBin* const* left,
+             const ComplexBin* const* right,
+             bool onto,
+             ComplexBin* sumL,
+             ComplexBin* sumR) {
+    std::size_t k = 0;
+    const auto next = [&](const ComplexBin*& x, const ComplexBin*& l, const ComplexBin*& r) {
+        x = input[k];
+        l = left[k];
+        r = right[k];
+        ++k;
     };
-    std::size_t done = 0;
-    if (partitions >= group) {
-        take.template operator()<group, true>();
-        done = group;
-    } else {
-        take.template operator()<1, true>();
-        done = 1;
-    }
-    for (; done + group <= partitions; done += group) {
-        take.template operator()<group, false>();
-    }
-    for (; done < partitions; ++done) {
-        take.template operator()<1, false>();
-    }
+    sumProducts<Lanes>(bins, count, onto, next, sumL, sumR);
 }
 
 }  // namespace

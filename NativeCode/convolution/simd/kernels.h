@@ -40,12 +40,24 @@ struct Kernels {
                     const float* input,
                     ComplexBin* bins,
                     float* work);
+    /// As `forward`, of M samples that M zeros follow; the zeros are not read.
+    void (*forwardHalf)(const TransformTables& tables,
+                        const float* input,
+                        ComplexBin* bins,
+                        float* work);
     /// M + 1 bins to 2M reals, no scale factor; imaginary parts of the first and last bin are
     /// ignored. No array may overlap another.
     void (*backward)(const TransformTables& tables,
                      const ComplexBin* bins,
                      float* output,
                      float* work);
+    /// As `backward`, of which only `samples` samples from the middle on, M to M + samples - 1, are
+    /// wanted: `output` holds 2M floats all the same, and the others are left undefined.
+    void (*backwardMiddle)(const TransformTables& tables,
+                           const ComplexBin* bins,
+                           float* output,
+                           float* work,
+                           std::size_t samples);
     /// y = a * b and y = a + b, bit for bit the same in every table; y may be a or b.
     void (*multiply)(std::size_t bins, const ComplexBin* a, const ComplexBin* b, ComplexBin* y);
     void (*add)(std::size_t bins, const ComplexBin* a, const ComplexBin* b, ComplexBin* y);
@@ -58,6 +70,16 @@ struct Kernels {
                     const ComplexBin* const* ring,
                     const ComplexBin* const* left,
                     const ComplexBin* const* right,
+                    ComplexBin* sumL,
+                    ComplexBin* sumR);
+    /// sumL = input[0] * left[0] + input[1] * left[1] + ..., `count` products, and sumR with right;
+    /// with `onto` they are added to what the sums hold. The tables differ as those of `ringSum`.
+    void (*listSum)(std::size_t bins,
+                    std::size_t count,
+                    const ComplexBin* const* input,
+                    const ComplexBin* const* left,
+                    const ComplexBin* const* right,
+                    bool onto,
                     ComplexBin* sumL,
                     ComplexBin* sumR);
 };

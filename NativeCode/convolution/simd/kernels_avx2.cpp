@@ -31,6 +31,16 @@ void forward(const TransformTables& tables, const float* input, ComplexBin* bins
     forwardLanes<LanesScalar>(tables, input, bins, work);
 }
 
+void forwardHalf(const TransformTables& tables, const float* input, ComplexBin* bins, float* work) {
+    if (tables.lanes == 8) {
+        return forwardHalfLanes<Lanes8>(tables, input, bins, work);
+    }
+    if (tables.lanes == 4) {
+        return forwardHalfLanes<Lanes4>(tables, input, bins, work);
+    }
+    forwardHalfLanes<LanesScalar>(tables, input, bins, work);
+}
+
 void backward(const TransformTables& tables, const ComplexBin* bins, float* output, float* work) {
     if (tables.lanes == 8) {
         return backwardLanes<Lanes8>(tables, bins, output, work);
@@ -41,13 +51,30 @@ void backward(const TransformTables& tables, const ComplexBin* bins, float* outp
     backwardLanes<LanesScalar>(tables, bins, output, work);
 }
 
+void backwardMiddle(const TransformTables& tables,
+                    const ComplexBin* bins,
+                    float* output,
+                    float* work,
+                    std::size_t samples) {
+    if (tables.lanes == 8) {
+        return backwardMiddleLanes<Lanes8>(tables, bins, output, work, samples);
+    }
+    if (tables.lanes == 4) {
+        return backwardMiddleLanes<Lanes4>(tables, bins, output, work, samples);
+    }
+    backwardMiddleLanes<LanesScalar>(tables, bins, output, work, samples);
+}
+
 constexpr Kernels table{.name = "avx2",
                         .transformLanes = transformLanes,
                         .forward = forward,
+                        .forwardHalf = forwardHalf,
                         .backward = backward,
+                        .backwardMiddle = backwardMiddle,
                         .multiply = multiplyBins<Lanes8>,
                         .add = addBins<Lanes8>,
-                        .ringSum = sumRing<Lanes8>};
+                        .ringSum = sumRing<Lanes8>,
+                        .listSum = sumList<Lanes8>};
 
 }  // namespace
 

@@ -37,6 +37,19 @@ void forward(const TransformTables& tables, const float* input, ComplexBin* bins
     forwardLanes<LanesScalar>(tables, input, bins, work);
 }
 
+void forwardHalf(const TransformTables& tables, const float* input, ComplexBin* bins, float* work) {
+    if (tables.lanes == 16) {
+        return forwardHalfLanes<Lanes16>(tables, input, bins, work);
+    }
+    if (tables.lanes == 8) {
+        return forwardHalfLanes<Lanes8>(tables, input, bins, work);
+    }
+    if (tables.lanes == 4) {
+        return forwardHalfLanes<Lanes4>(tables, input, bins, work);
+    }
+    forwardHalfLanes<LanesScalar>(tables, input, bins, work);
+}
+
 void backward(const TransformTables& tables, const ComplexBin* bins, float* output, float* work) {
     if (tables.lanes == 16) {
         return backwardLanes<Lanes16>(tables, bins, output, work);
@@ -50,13 +63,33 @@ void backward(const TransformTables& tables, const ComplexBin* bins, float* outp
     backwardLanes<LanesScalar>(tables, bins, output, work);
 }
 
+void backwardMiddle(const TransformTables& tables,
+                    const ComplexBin* bins,
+                    float* output,
+                    float* work,
+                    std::size_t samples) {
+    if (tables.lanes == 16) {
+        return backwardMiddleLanes<Lanes16>(tables, bins, output, work, samples);
+    }
+    if (tables.lanes == 8) {
+        return backwardMiddleLanes<Lanes8>(tables, bins, output, work, samples);
+    }
+    if (tables.lanes == 4) {
+        return backwardMiddleLanes<Lanes4>(tables, bins, output, work, samples);
+    }
+    backwardMiddleLanes<LanesScalar>(tables, bins, output, work, samples);
+}
+
 constexpr Kernels table{.name = "avx512",
                         .transformLanes = transformLanes,
                         .forward = forward,
+                        .forwardHalf = forwardHalf,
                         .backward = backward,
+                        .backwardMiddle = backwardMiddle,
                         .multiply = multiplyBins<Lanes16>,
                         .add = addBins<Lanes16>,
-                        .ringSum = sumRing<Lanes16>};
+                        .ringSum = sumRing<Lanes16>,
+                        .listSum = sumList<Lanes16>};
 
 }  // namespace
 

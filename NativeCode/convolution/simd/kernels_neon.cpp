@@ -27,6 +27,13 @@ void forward(const TransformTables& tables, const float* input, ComplexBin* bins
     forwardLanes<LanesScalar>(tables, input, bins, work);
 }
 
+void forwardHalf(const TransformTables& tables, const float* input, ComplexBin* bins, float* work) {
+    if (tables.lanes == 4) {
+        return forwardHalfLanes<LanesNeon>(tables, input, bins, work);
+    }
+    forwardHalfLanes<LanesScalar>(tables, input, bins, work);
+}
+
 void backward(const TransformTables& tables, const ComplexBin* bins, float* output, float* work) {
     if (tables.lanes == 4) {
         return backwardLanes<LanesNeon>(tables, bins, output, work);
@@ -34,13 +41,27 @@ void backward(const TransformTables& tables, const ComplexBin* bins, float* outp
     backwardLanes<LanesScalar>(tables, bins, output, work);
 }
 
+void backwardMiddle(const TransformTables& tables,
+                    const ComplexBin* bins,
+                    float* output,
+                    float* work,
+                    std::size_t samples) {
+    if (tables.lanes == 4) {
+        return backwardMiddleLanes<LanesNeon>(tables, bins, output, work, samples);
+    }
+    backwardMiddleLanes<LanesScalar>(tables, bins, output, work, samples);
+}
+
 constexpr Kernels table{.name = "neon",
                         .transformLanes = transformLanes,
                         .forward = forward,
+                        .forwardHalf = forwardHalf,
                         .backward = backward,
+                        .backwardMiddle = backwardMiddle,
                         .multiply = multiplyBins<LanesNeon>,
                         .add = addBins<LanesNeon>,
-                        .ringSum = sumRing<LanesNeon>};
+                        .ringSum = sumRing<LanesNeon>,
+                        .listSum = sumList<LanesNeon>};
 
 }  // namespace
 

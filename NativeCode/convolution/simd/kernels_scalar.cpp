@@ -42,13 +42,34 @@ void ringSum(std::size_t bins,
     }
 }
 
+void listSum(std::size_t bins,
+             std::size_t count,
+             const ComplexBin* const* input,
+             const ComplexBin* const* left,
+             const ComplexBin* const* right,
+             bool onto,
+             ComplexBin* sumL,
+             ComplexBin* sumR) {
+    for (std::size_t n = 0; n < count; ++n) {
+        for (std::size_t i = 0; i < bins; ++i) {
+            const ComplexBin l = product(input[n][i], left[n][i]);
+            const ComplexBin r = product(input[n][i], right[n][i]);
+            sumL[i] = n == 0 && !onto ? l : sum(l, sumL[i]);
+            sumR[i] = n == 0 && !onto ? r : sum(r, sumR[i]);
+        }
+    }
+}
+
 constexpr Kernels table{.name = "scalar",
                         .transformLanes = transformLanes,
                         .forward = forwardLanes<LanesScalar>,
+                        .forwardHalf = forwardHalfLanes<LanesScalar>,
                         .backward = backwardLanes<LanesScalar>,
+                        .backwardMiddle = backwardMiddleLanes<LanesScalar>,
                         .multiply = multiply,
                         .add = add,
-                        .ringSum = ringSum};
+                        .ringSum = ringSum,
+                        .listSum = listSum};
 
 }  // namespace
 

@@ -25,6 +25,13 @@ void forward(const TransformTables& tables, const float* input, ComplexBin* bins
     forwardLanes<LanesScalar>(tables, input, bins, work);
 }
 
+void forwardHalf(const TransformTables& tables, const float* input, ComplexBin* bins, float* work) {
+    if (tables.lanes == 4) {
+        return forwardHalfLanes<Lanes4>(tables, input, bins, work);
+    }
+    forwardHalfLanes<LanesScalar>(tables, input, bins, work);
+}
+
 void backward(const TransformTables& tables, const ComplexBin* bins, float* output, float* work) {
     if (tables.lanes == 4) {
         return backwardLanes<Lanes4>(tables, bins, output, work);
@@ -32,13 +39,27 @@ void backward(const TransformTables& tables, const ComplexBin* bins, float* outp
     backwardLanes<LanesScalar>(tables, bins, output, work);
 }
 
+void backwardMiddle(const TransformTables& tables,
+                    const ComplexBin* bins,
+                    float* output,
+                    float* work,
+                    std::size_t samples) {
+    if (tables.lanes == 4) {
+        return backwardMiddleLanes<Lanes4>(tables, bins, output, work, samples);
+    }
+    backwardMiddleLanes<LanesScalar>(tables, bins, output, work, samples);
+}
+
 constexpr Kernels table{.name = "sse2",
                         .transformLanes = transformLanes,
                         .forward = forward,
+                        .forwardHalf = forwardHalf,
                         .backward = backward,
+                        .backwardMiddle = backwardMiddle,
                         .multiply = multiplyBins<Lanes4>,
                         .add = addBins<Lanes4>,
-                        .ringSum = sumRing<Lanes4>};
+                        .ringSum = sumRing<Lanes4>,
+                        .listSum = sumList<Lanes4>};
 
 }  // namespace
 
