@@ -1,4 +1,4 @@
-// A zero-filled array on a 64-byte boundary, sized once.
+// An array on a 64-byte boundary, sized once, zero-filled unless told otherwise.
 #pragma once
 
 #include <cstddef>
@@ -7,7 +7,13 @@
 #include <type_traits>
 #include <utility>
 
+#include "base/aligned_memory.h"
+
 namespace tessaly {
+
+/// Says that all of an array is written before any of it is read.
+struct ForOverwrite {};
+inline constexpr ForOverwrite forOverwrite{};
 
 /// Owns `size` zero-filled elements aligned to 64 bytes (one cache line, one widest vector).
 /// Load time: allocates. Element access is unchecked.
@@ -16,14 +22,19 @@ class AlignedArray {
     static_assert(std::is_trivially_copyable_v<T> && std::is_trivially_destructible_v<T>);
 
 public:
-    static constexpr std::size_t alignment = 64;
+    static constexpr std::size_t alignment = memoryAlignment;
 
     AlignedArray() noexcept = default;
+    /// @throws std::bad_alloc
     explicit AlignedArray(std::size_t size) : size_(size) {
         if (size_ > 0) {
-            data_ =
-                static_cast<T*>(::operator new (size_ * sizeof(T), std::align_val_t{alignment}));
-            clear();
+            take(allocateZeroed(size_ * sizeof(T)));
+        }
+    }
+    /// Without values. @throws std::bad_alloc
+    AlignedArray(std::size_t size, ForOverwrite) : size_(size) {
+        if (size_ > 0) {
+            take(allocateForOverwrite(size_ * sizeof(T)));
         }
     }
     AlignedArray(AlignedArray&& other) noexcept
@@ -59,11 +70,13 @@ public:
     }
 
 private:
-    void release() noexcept {
-        if (data_ != nullptr) {
-            ::operator delete (data_, std::align_val_t{alignment});
+    void take(void* memory) {
+        if (memory == nullptr) {
+            throw std::bad_alloc();
         }
+        data_ = static_cast<T*>(memory);
     }
+    void release() noexcept { releaseAligned(data_); }
 
     T* data_ = nullptr;
     std::size_t size_ = 0;

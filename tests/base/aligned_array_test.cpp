@@ -5,7 +5,10 @@
 
 #include <algorithm>
 #include <complex>
+#include <cstddef>
 #include <cstdint>
+#include <limits>
+#include <new>
 #include <utility>
 
 namespace tessaly {
@@ -28,6 +31,40 @@ TEST(AlignedArray, IsFilledWithZeros) {
         EXPECT_TRUE(std::all_of(array.begin(), array.end(), [](float v) { return v == 0.0f; }));
         std::fill(array.begin(), array.end(), 3.0f);
     }
+}
+
+TEST(AlignedArray, LargeOnesAreZeroToo) {
+    constexpr std::size_t size = (std::size_t{1} << 18) + 3;
+    for (int round = 0; round < 3; ++round) {
+        AlignedArray<float> array(size);
+        EXPECT_EQ(reinterpret_cast<std::uintptr_t>(array.data()) % 64, 0u);
+        EXPECT_EQ(std::count(array.begin(), array.end(), 0.0f), static_cast<std::ptrdiff_t>(size));
+        std::fill(array.begin(), array.end(), 3.0f);
+    }
+}
+
+TEST(AlignedArray, MayComeWithoutValues) {
+    for (const std::size_t size : {1u, 17u, 4097u, 1u << 18}) {
+        AlignedArray<float> array(size, forOverwrite);
+        EXPECT_EQ(reinterpret_cast<std::uintptr_t>(array.data()) % 64, 0u) << size;
+        EXPECT_EQ(array.size(), size);
+        std::fill(array.begin(), array.end(), 3.0f);
+        EXPECT_EQ(array[size - 1], 3.0f);
+    }
+    const AlignedArray<float> none(0, forOverwrite);
+    EXPECT_EQ(none.data(), nullptr);
+}
+
+TEST(AlignedArray, MissingMemoryThrows) {
+    // Refused before the system is asked: with the room for alignment the sum would wrap.
+    constexpr std::size_t most = std::numeric_limits<std::size_t>::max();
+    for (const std::size_t size : {most - 64, most - 8, most}) {
+        EXPECT_THROW(AlignedArray<char>{size}, std::bad_alloc) << size;
+        EXPECT_THROW((AlignedArray<char>{size, forOverwrite}), std::bad_alloc) << size;
+    }
+    EXPECT_EQ(allocateZeroed(most), nullptr);
+    EXPECT_EQ(allocateForOverwrite(most), nullptr);
+    releaseAligned(nullptr);
 }
 
 TEST(AlignedArray, ClearSetsEveryElementToZero) {
