@@ -1,5 +1,6 @@
-// Multiply-accumulate of both ears over a ring: our tables, fused, and plain separate passes.
-// Names: Mac/<table or plain>/<block length>/<partitions>.
+// Multiply-accumulate of both ears over a ring: our tables, fused; plain separate scalar passes;
+// and nothing but reading the same spectra, which bounds them all. Names: Mac/<table, plain or
+// read>/<block length>/<partitions>.
 #include <benchmark/benchmark.h>
 
 #include <string>
@@ -7,8 +8,9 @@
 
 #include "base/aligned_array.h"
 #include "convolution/bench_noise.h"
+#include "convolution/plain_passes.h"
+#include "convolution/read_limit.h"
 #include "convolution/simd/kernels.h"
-#include "support/plain_spectral.h"
 
 namespace tessaly::bench {
 namespace {
@@ -30,7 +32,10 @@ private:
     std::vector<ComplexBin*> entries_;
 };
 
+enum class Form { fused, plain, read };
+
 void multiply(benchmark::State& state,
+              Form form,
               const Kernels* kernels,
               std::size_t blockLength,
               std::size_t partitions) {
@@ -43,34 +48,44 @@ void multiply(benchmark::State& state,
     AlignedArray<ComplexBin> scratch(bins);
     std::size_t newest = 0;
     for (auto _ : state) {
-        if (kernels != nullptr) {
+        if (form == Form::fused) {
             kernels->ringSum(bins, partitions, newest, ring.data(), left.data(), right.data(),
                              sumL.data(), sumR.data());
+        } else if (form == Form::plain) {
+            plainRingSum(bins, partitions, newest, ring.data(), left.data(), scratch.data(),
+                         sumL.data());
+            plainRingSum(bins, partitions, newest, ring.data(), right.data(), scratch.data(),
+                         sumR.data());
         } else {
-            test::plainRing(bins, partitions, newest, ring.data(), left.data(), scratch.data(),
-                            sumL.data());
-            test::plainRing(bins, partitions, newest, ring.data(), right.data(), scratch.data(),
-                            sumR.data());
+            for (std::size_t i = 0; i < partitions; ++i) {
+                benchmark::DoNotOptimize(readStreams(2 * bins, &ring.data()[i]->re,
+                                                     &left.data()[i]->re, &right.data()[i]->re));
+            }
         }
         benchmark::ClobberMemory();
         newest = (newest + 1) % partitions;
     }
 }
 
+void add(const char* name,
+         Form form,
+         const Kernels* kernels,
+         std::size_t blockLength,
+         std::size_t partitions) {
+    const std::string row = std::string("Mac/") + name + "/" + std::to_string(blockLength) + "/" +
+                            std::to_string(partitions);
+    benchmark::RegisterBenchmark(row.c_str(), multiply, form, kernels, blockLength, partitions);
+}
+
 const bool registered = [] {
     for (const std::size_t blockLength : {256u, 1024u}) {
-        for (const std::size_t partitions : {1u, 8u, 46u, 216u}) {
-            const std::string tail =
-                "/" + std::to_string(blockLength) + "/" + std::to_string(partitions);
+        for (const std::size_t partitions : {1u, 16u, 73u, 216u}) {
             const KernelList& list = availableKernels();
             for (std::size_t i = 0; i < list.count; ++i) {
-                const std::string name = std::string("Mac/") + list.tables[i]->name + tail;
-                benchmark::RegisterBenchmark(name.c_str(), multiply, list.tables[i], blockLength,
-                                             partitions);
+                add(list.tables[i]->name, Form::fused, list.tables[i], blockLength, partitions);
             }
-            benchmark::RegisterBenchmark(("Mac/plain" + tail).c_str(), multiply,
-                                         static_cast<const Kernels*>(nullptr), blockLength,
-                                         partitions);
+            add("plain", Form::plain, nullptr, blockLength, partitions);
+            add("read", Form::read, nullptr, blockLength, partitions);
         }
     }
     return true;

@@ -1,0 +1,111 @@
+// One block of zita-convolver under the same responses, still, mono to two ears.
+// Names: Convolver/still/<zita_uniform or zita_default>/<block length>/<taps>: all partitions of
+// the block's length in vector mode, or the partitions it chooses by itself and no option. In the
+// second form a thread for each larger partition size works beside the caller. A block here waits
+// for what they still owe, and the time is that of the processor for all threads of the program.
+#include <benchmark/benchmark.h>
+#include <zita-convolver.h>
+
+#include <algorithm>
+#include <cmath>
+#include <string>
+#include <vector>
+
+#include "convolution/convolver.h"
+
+namespace tessaly::bench {
+namespace {
+
+class Peer {
+public:
+    Peer(bool uniform, std::int32_t blockLength, std::int32_t taps)
+        : length_(static_cast<std::size_t>(blockLength)) {
+        // Plans as it makes them, not those that another row has measured.
+        fftwf_forget_wisdom();
+        const auto block = static_cast<std::uint32_t>(blockLength);
+        const std::uint32_t largest = uniform ? block : std::uint32_t{Convproc::MAXPART};
+        if (uniform) {
+            process_.set_options(Convproc::OPT_VECTOR_MODE);
+        }
+        good_ = process_.configure(1, 2, static_cast<std::uint32_t>(taps), block, block, largest,
+                                   0.0f) == 0;
+        for (unsigned ear = 0; ear < 2; ++ear) {
+            std::vector<float> response = noiseResponse(taps, ear);
+            good_ = good_ && process_.impdata_create(0, ear, 1, response.data(), 0, taps) == 0;
+        }
+        good_ = good_ && process_.start_process(0, SCHED_OTHER) == 0;
+    }
+    ~Peer() {
+        process_.stop_process();
+        process_.cleanup();
+    }
+    Peer(const Peer&) = delete;
+    Peer& operator=(const Peer&) = delete;
+
+    bool good() const { return good_; }
+    void block(const float* input) {
+        std::copy_n(input, length_, process_.inpdata(0));
+        good_ = process_.process(true) == 0 && good_;
+    }
+    const float* output(unsigned ear) const { return process_.outdata(ear); }
+
+private:
+    std::size_t length_;
+    bool good_ = false;
+    Convproc process_;
+};
+
+/// Both convolvers must have made the same sound, at our scale of 2B.
+bool agrees(const Convolver& ours, const Peer& peer, std::int32_t blockLength) {
+    const float scale = 1.0f / (2.0f * static_cast<float>(blockLength));
+    for (unsigned ear = 0; ear < 2; ++ear) {
+        float largest = 0.0f;
+        float difference = 0.0f;
+        for (std::int32_t i = 0; i < blockLength; ++i) {
+            const float expected = ours.output(ear)[i] * scale;
+            largest = std::max(largest, std::abs(expected));
+            difference = std::max(difference, std::abs(peer.output(ear)[i] - expected));
+        }
+        if (!(difference <= 1e-4f * largest)) {
+            return false;
+        }
+    }
+    return true;
+}
+
+void convolve(benchmark::State& state, bool uniform, std::int32_t blockLength, std::int32_t taps) {
+    Peer peer(uniform, blockLength, taps);
+    Convolver ours(blockLength, taps);
+    InputBlocks input(blockLength);
+    for (std::int32_t k = 0; k < taps; k += blockLength) {
+        const float* const block = input.next();
+        ours.still(block);
+        peer.block(block);
+    }
+    if (!peer.good() || !agrees(ours, peer, blockLength)) {
+        state.SkipWithError("its output differs from ours");
+        return;
+    }
+    for (auto _ : state) {
+        peer.block(input.next());
+        benchmark::ClobberMemory();
+    }
+}
+
+const bool registered = [] {
+    for (const std::int32_t blockLength : blockLengths) {
+        for (const std::int32_t taps : tapCounts) {
+            for (const bool uniform : {true, false}) {
+                const std::string name = std::string("Convolver/still/") +
+                                         (uniform ? "zita_uniform/" : "zita_default/") +
+                                         std::to_string(blockLength) + "/" + std::to_string(taps);
+                benchmark::RegisterBenchmark(name.c_str(), convolve, uniform, blockLength, taps)
+                    ->MeasureProcessCPUTime();
+            }
+        }
+    }
+    return true;
+}();
+
+}  // namespace
+}  // namespace tessaly::bench
