@@ -22,6 +22,7 @@ constexpr float ratioAt48000 = 1.0884354f;      // 48000 / 44100
 constexpr double firstDistanceOffset = 0.4;     // metres: the first block must see a change
 constexpr float firstInterpAngleOffset = 5.0f;  // degrees: the first blend takes the new buffer
 constexpr std::size_t debugDumpBytes = 8519680;
+constexpr const char* stopLine = "___tessCore_Stop";
 
 bool isPowerOfTwo(int value) noexcept { return value >= 2 && (value & (value - 1)) == 0; }
 
@@ -324,7 +325,8 @@ SpatialEngine::SpatialEngine(std::string instanceName,
         essError = essErrorSpectrumMemory;
     }
     if (state.complete) {
-        Stop();
+        // All buffers are fresh: what `Stop` clears is zero already, and much of it untouched.
+        logOutput(stopLine);
     }
 }
 
@@ -336,7 +338,7 @@ SpatialEngine::~SpatialEngine() {
 }
 
 int SpatialEngine::Stop() {
-    logOutput("___tessCore_Stop");
+    logOutput(stopLine);
     EngineState& state = *state_;
     state.frontEnd.inputHistoryBuffer.clear();
     state.composer.filterLeftBuffer.clear();

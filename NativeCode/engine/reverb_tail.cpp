@@ -47,8 +47,12 @@ void ReverbTail::loadIReverb(std::int16_t preset, std::int16_t& qvReverb, WavSou
     } else {
         reverbPresetGain = row->reverbPresetGain;
         reverbLength = reverbFramesAt(source.sampleRate, row->length48000);
-        reverbIR = AlignedArray<float>(static_cast<std::size_t>(reverbLength) * 2);
+        const auto floats = static_cast<std::size_t>(reverbLength) * 2;
+        // The reader fills what the packed file does not hold; a file of its own may be refused.
+        reverbIR = source.usePackedDatabase ? AlignedArray<float>(floats, forOverwrite)
+                                            : AlignedArray<float>(floats);
         source.loadingReverb = true;
+        source.zeroMissing = true;
         source.qvReverb = preset;
         source.reverbLength = reverbLength;
         readWav(source, row->name, reverbIR.data(), reverbLength, 2);

@@ -5,6 +5,7 @@
 #include <array>
 #include <bit>
 #include <cstddef>
+#include <cstring>
 #include <fstream>
 
 #include "base/ess_error.h"
@@ -40,21 +41,73 @@ T readAt(std::ifstream& file, std::streamoff offset) {
     return std::bit_cast<T>(bytes);
 }
 
-/// Converts `count` stored values from the file's position on. At the end of the file the rest
-/// of `destination` stays as it is.
-template <typename Stored, typename Convert>
-void readSamples(std::ifstream& file, float* destination, std::uint32_t count, Convert convert) {
-    std::array<Stored, 4096> chunk{};
-    while (count > 0) {
-        const std::uint32_t asked = std::min<std::uint32_t>(count, chunk.size());
-        file.read(reinterpret_cast<char*>(chunk.data()),
-                  static_cast<std::streamsize>(asked * sizeof(Stored)));
-        const auto got = static_cast<std::uint32_t>(file.gcount()) / sizeof(Stored);
-        destination = std::transform(chunk.begin(), chunk.begin() + got, destination, convert);
-        if (got < asked) {
+/// Of `count` wanted values those that lie whole between the file's position and its end.
+std::size_t heldValues(std::ifstream& file, std::size_t count, std::size_t valueBytes) {
+    const std::streamoff start = file.tellg();
+    file.seekg(0, std::ios::end);
+    const std::streamoff end = file.tellg();
+    file.seekg(start);
+    return start < 0 || end <= start
+               ? 0
+               : std::min(count, static_cast<std::size_t>(end - start) / valueBytes);
+}
+
+/// @return values read, all of them unless the file changes meanwhile
+template <typename Stored>
+std::size_t readValues(std::ifstream& file, Stored* values, std::size_t count) {
+    file.read(reinterpret_cast<char*>(values),
+              static_cast<std::streamsize>(count * sizeof(Stored)));
+    return static_cast<std::size_t>(file.gcount()) / sizeof(Stored);
+}
+
+/// Turns values upside down where they stand.
+void invert(float* values, std::size_t count) noexcept {
+    // Steps of a fixed length go through vector registers in every build.
+    constexpr std::size_t step = 16;
+    std::size_t i = 0;
+    for (; i + step <= count; i += step) {
+        for (std::size_t k = 0; k < step; ++k) {
+            values[i + k] = -values[i + k];
+        }
+    }
+    for (; i < count; ++i) {
+        values[i] = -values[i];
+    }
+}
+
+// Both read from the file's position on. At the end of the file the rest of `destination` stays as
+// it is. A piece is still in the inner caches when its values are converted.
+constexpr std::size_t pieceBytes = std::size_t{1} << 16;
+
+void readFloats(std::ifstream& file, float* destination, std::size_t count, bool inverted) {
+    constexpr std::size_t piece = pieceBytes / sizeof(float);
+    std::size_t left = heldValues(file, count, sizeof(float));
+    while (left > 0) {
+        const std::size_t got = readValues(file, destination, std::min(left, piece));
+        if (got == 0) {
             return;
         }
-        count -= asked;
+        if (inverted) {
+            invert(destination, got);
+        }
+        destination += got;
+        left -= got;
+    }
+}
+
+void readIntegers(std::ifstream& file, float* destination, std::size_t count) {
+    std::array<std::int16_t, 4096> piece;
+    std::size_t left = heldValues(file, count, sizeof(std::int16_t));
+    while (left > 0) {
+        const std::size_t got = readValues(file, piece.data(), std::min(left, piece.size()));
+        if (got == 0) {
+            return;
+        }
+        for (std::size_t i = 0; i < got; ++i) {
+            destination[i] = static_cast<float>(piece[i]) * fromInt16;
+        }
+        destination += got;
+        left -= got;
     }
 }
 
@@ -72,20 +125,28 @@ std::streamoff findData(std::ifstream& file) {
 }
 
 bool readTail(const WavSource& source, float* destination) {
+    const std::streamsize wanted = tailFrameBytes * std::max(source.reverbLength, 0);
+    std::streamsize got = 0;
     std::ifstream file(source.IRfilePath, std::ios::binary);
-    if (!file) {
+    const bool opened = file.is_open();
+    if (opened) {
+        // A start outside the file makes the seek or the read fail: nothing is read.
+        const std::streamoff start =
+            readAt<std::int32_t>(file, std::streamoff{4} * source.qvReverb - 2);
+        file.seekg(std::streamoff{4} * (tailIndexEntries + 2 * start) + 2);
+        if (wanted > 0) {
+            file.read(reinterpret_cast<char*>(destination), wanted);
+            got = file.gcount();
+        }
+    } else {
         logBoth("Tessaly_e ERROR: Wav ", source.IRfilePath, " not readable!!!!");
         essError = essErrorTailUnreadable;
-        return false;
     }
-    // A start outside the file makes the seek or the read fail: the tail stays as it is.
-    const std::streamoff start =
-        readAt<std::int32_t>(file, std::streamoff{4} * source.qvReverb - 2);
-    file.seekg(std::streamoff{4} * (tailIndexEntries + 2 * start) + 2);
-    if (source.reverbLength > 0) {
-        file.read(reinterpret_cast<char*>(destination), tailFrameBytes * source.reverbLength);
+    if (source.zeroMissing && got < wanted) {
+        std::memset(reinterpret_cast<char*>(destination) + got, 0,
+                    static_cast<std::size_t>(wanted - got));
     }
-    return true;
+    return opened;
 }
 
 std::string resolveName(const WavSource& source, const std::string& path) {
@@ -146,14 +207,10 @@ bool readWav(const WavSource& source,
         return false;
     }
     file.seekg(data + dataStartOffset);
-    if (bits == 32 && rate == invertedRate) {
-        readSamples<float>(file, destination, wanted, [](float value) { return -value; });
-    } else if (bits == 32) {
-        readSamples<float>(file, destination, wanted, [](float value) { return value; });
+    if (bits == 32) {
+        readFloats(file, destination, wanted, rate == invertedRate);
     } else if (bits == 16) {
-        readSamples<std::int16_t>(file, destination, wanted, [](std::int16_t value) {
-            return static_cast<float>(value) * fromInt16;
-        });
+        readIntegers(file, destination, wanted);
     } else {
         logBoth("Tessaly_e ERROR: Wav not 32 or 16 Bit!!!!");
         essError = essErrorWavBitDepth;

@@ -15,11 +15,13 @@ struct WavSource {
     int sampleRate = 0;             ///< Hz; picks the suffix of a tail's own file
     std::int16_t qvReverb = 0;      ///< tail preset, 1..60: entry of the packed file's index
     int reverbLength = 0;           ///< frames of the tail to read in packed form
+    bool zeroMissing = false;       ///< packed tail: what the file does not hold becomes zero
 };
 
 /// Reads one sound file. Load time: opens a file.
 /// Packed tail (`usePackedDatabase` and `loadingReverb`): `path`, `frames` and `channels` are
-/// ignored, `reverbLength` raw float pairs are read. A short file leaves the rest untouched.
+/// ignored, `reverbLength` raw float pairs are read. A short file leaves the rest untouched, unless
+/// `zeroMissing` is set.
 /// @param path         name with a leading "/", with or without extension
 /// @param destination  frames * channels floats, interleaved, full scale 1.0
 /// @param frames       frames wanted; a longer file is accepted, a shorter one is error -108

@@ -8,6 +8,7 @@
 #include <cstdint>
 #include <cstdio>
 #include <cstring>
+#include <fstream>
 #include <limits>
 #include <string>
 #include <utility>
@@ -274,6 +275,42 @@ TEST_F(WavReader, DataThatEndsBeforeItsSizeLeavesTheRestUntouched) {
     }
 }
 
+// ---- Cost ----
+
+/// Read calls of this process so far, as the system counts them; -1 where it does not.
+long readCalls() {
+    std::ifstream counters("/proc/self/io");
+    std::string name;
+    for (long value = 0; counters >> name >> value;) {
+        if (name == "syscr:") {
+            return value;
+        }
+    }
+    return -1;
+}
+
+TEST_F(WavReader, FilesAreReadInLargeBlocks) {
+    if (readCalls() < 0) {
+        GTEST_SKIP() << "the system counts no calls";
+    }
+    const long counting = -readCalls() + readCalls();
+    constexpr int frames = 100000;
+    constexpr long header = 12;  // a seek and a read for each field
+    const std::vector<float> samples(2 * frames, 0.25f);
+    for (const int bits : {32, 16}) {
+        for (const int rate : {44100, 48000}) {
+            test::writeWav(directory_.file("/a.wav"), 2, rate, bits, samples);
+            values_.assign(samples.size(), untouched);
+            const long before = readCalls();
+            ASSERT_TRUE(readWav(plain(), "/a.wav", values_.data(), frames, 2));
+            const long calls = readCalls() - before - counting;
+            const long bytes = 2L * frames * bits / 8;
+            EXPECT_LE(calls, header + bytes / 8192 + 1) << bits << " bits, " << rate;
+            EXPECT_GT(calls, 0);
+        }
+    }
+}
+
 // ---- Names ----
 
 TEST_F(WavReader, NamesFollowTheMode) {
@@ -393,6 +430,42 @@ TEST_F(PackedTail, AShortFileLeavesTheRestUntouched) {
     EXPECT_THAT(values_, ElementsAre(3.0f, 4.0f, 5.0f, 6.0f, untouched, untouched, untouched,
                                      untouched, untouched, untouched));
     EXPECT_EQ(essError, essErrorNone);
+}
+
+TEST_F(PackedTail, WhatTheFileDoesNotHoldMayBecomeZero) {
+    const auto readZeroed = [&](int preset) {
+        values_.assign(10, untouched);
+        WavSource source = tail(preset, 4);
+        source.zeroMissing = true;
+        return readWav(source, "", values_.data(), 0, 0);
+    };
+    writeTails(1, 3);
+    EXPECT_TRUE(readZeroed(15));
+    EXPECT_THAT(values_,
+                ElementsAre(3.0f, 4.0f, 5.0f, 6.0f, 0.0f, 0.0f, 0.0f, 0.0f, untouched, untouched));
+    writeTails(1000, 3);
+    EXPECT_TRUE(readZeroed(15));
+    EXPECT_THAT(values_,
+                ElementsAre(0.0f, 0.0f, 0.0f, 0.0f, 0.0f, 0.0f, 0.0f, 0.0f, untouched, untouched));
+    std::remove(directory_.file("/TSLdata510.dat").c_str());
+    EXPECT_FALSE(readZeroed(15));
+    EXPECT_THAT(values_,
+                ElementsAre(0.0f, 0.0f, 0.0f, 0.0f, 0.0f, 0.0f, 0.0f, 0.0f, untouched, untouched));
+    EXPECT_EQ(essError, essErrorTailUnreadable);
+}
+
+TEST_F(PackedTail, IsReadAtOnce) {
+    if (readCalls() < 0) {
+        GTEST_SKIP() << "the system counts no calls";
+    }
+    const long counting = -readCalls() + readCalls();
+    constexpr int frames = 50000;
+    writeTails(0, frames);
+    values_.assign(2 * frames, untouched);
+    const long before = readCalls();
+    ASSERT_TRUE(readWav(tail(15, frames), "", values_.data(), 0, 0));
+    EXPECT_LE(readCalls() - before - counting, 4) << "index, samples and what the stream adds";
+    EXPECT_EQ(values_.back(), 2.0f * frames);
 }
 
 TEST_F(PackedTail, StartsOutsideOfTheFileReadNothing) {
