@@ -7,12 +7,10 @@
 #include <exception>
 #include <filesystem>
 #include <fstream>
-#include <memory>
 #include <stdexcept>
 #include <string>
 
 #include "convolution/bench_noise.h"
-#include "minihost/pose.h"
 
 namespace tessaly::bench {
 
@@ -28,57 +26,80 @@ void readThrough(const fs::path& file) {
     }
 }
 
-std::unique_ptr<PluginLibrary> openLibrary() {
-    auto opened = std::make_unique<PluginLibrary>(PluginLibrary::locate(""));
+/// The directory of the data set, empty if there is none.
+fs::path findData(const fs::path& library) {
     const char* given = std::getenv("TESSALY_DATA");
     const fs::path data = given != nullptr && *given != '\0'
                               ? fs::path(given)
-                              : (opened->file().parent_path() / "../../data").lexically_normal();
+                              : (library.parent_path() / "../../data").lexically_normal();
     for (const char* name : {"TSLdata120.dat", "TSLdata121.dat", "TSLdata511.dat"}) {
         if (!fs::exists(data / name)) {
             std::fprintf(stderr,
                          "bench_plugin: left out, no data set in %s; tessaly-data all --out %s "
                          "makes one\n",
                          data.c_str(), data.c_str());
-            return nullptr;
+            return {};
         }
         readThrough(data / name);
     }
-    if (!opened->setStreamingAssetsPath(data.string())) {
-        throw std::runtime_error("the library refuses " + data.string());
+    return data;
+}
+
+std::vector<Candidate> openCandidates() {
+    const fs::path built = PluginLibrary::locate("");
+    const fs::path data = findData(built);
+    std::vector<Candidate> opened;
+    if (data.empty()) {
+        return opened;
+    }
+    opened.push_back({"tessaly", PluginLibrary(built)});
+    const char* other = std::getenv("TESSALY_AGAINST");
+    if (other != nullptr && *other != '\0') {
+        // A copy: also the same file has a state of its own then.
+        opened.push_back({"against", PluginLibrary::privateCopy(PluginLibrary::locate(other))});
+    }
+    for (const Candidate& one : opened) {
+        if (!one.library.setStreamingAssetsPath(data.string())) {
+            throw std::runtime_error("the library refuses " + data.string());
+        }
     }
     return opened;
 }
 
 }  // namespace
 
-const PluginLibrary* library() {
-    static const std::unique_ptr<PluginLibrary> opened = [] {
+const std::vector<Candidate>& candidates() {
+    static const std::vector<Candidate> opened = [] {
         try {
-            return openLibrary();
+            return openCandidates();
         } catch (const std::exception& failure) {
             std::fprintf(stderr, "bench_plugin: %s\n", failure.what());
             std::exit(1);
         }
     }();
-    return opened.get();
+    return opened;
 }
 
-void expectNoError(benchmark::State& state) {
-    if (library()->getErrorState() != 1) {
+void expectNoError(benchmark::State& state, const PluginLibrary& library) {
+    if (library.getErrorState() != 1) {
         state.SkipWithError("the library reports a failure");
     }
 }
 
-Played::Played(const char* effect, std::uint32_t blockLength)
+Vector3 walk(int step, int source, int sources) {
+    return fromSpherical((step * 7 + 360 * source / sources) % 360, (step + 11 * source) % 60 - 30,
+                         1.0 + 0.01 * ((step + 37 * source) % 200));
+}
+
+Played::Played(const PluginLibrary& library, const char* effect, std::uint32_t blockLength)
     : frames_(blockLength),
-      effect_(library()->effect(effect), sampleRate, blockLength),
+      effect_(library.effect(effect), sampleRate, blockLength),
       in_(2 * static_cast<std::size_t>(blockLength)),
       out_(in_.size()) {}
 
-void Played::place(double azimuth, double elevation, double distance) {
+void Played::place(const Vector3& position) {
     Pose source;
-    source.position = fromSpherical(azimuth, elevation, distance);
+    source.position = position;
     effect_.place(Pose{}, source);
 }
 

@@ -4,33 +4,50 @@
 #include <benchmark/benchmark.h>
 
 #include <cstdint>
+#include <string>
 #include <vector>
 
 #include "minihost/effect_instance.h"
 #include "minihost/plugin_library.h"
+#include "minihost/pose.h"
 
 namespace tessaly::bench {
 
 inline constexpr std::uint32_t sampleRate = 48000;
+inline constexpr std::uint32_t blockLengths[] = {256, 1024};
 inline constexpr int roomCount = 53;
+/// Room of the reflections and of the tail that most rows play: 8192 frames and 1.5 s.
+inline constexpr float hallSelection = 5.0f;
 
-/// The library, with the path set and one source played, so that its tables are there; null where
-/// there is no data set. The set is looked for in the directory that the environment variable
-/// TESSALY_DATA names, else in "data" beside the build folder. Says once what is missing.
-const PluginLibrary* library();
+/// A library whose rows stand side by side with those of the other.
+struct Candidate {
+    std::string name;  ///< in the rows' names: "tessaly", or "against" for the other one
+    PluginLibrary library;
+};
+
+/// The built library and, if the environment variable TESSALY_AGAINST names the file of another
+/// one, that as well; each with the path set and the files in memory. Empty where there is no data
+/// set; it is looked for in the directory that TESSALY_DATA names, else in "data" beside the build
+/// folder. Says once what is missing.
+const std::vector<Candidate>& candidates();
 
 /// Fails a benchmark after which the library reports an error.
-void expectNoError(benchmark::State& state);
+void expectNoError(benchmark::State& state, const PluginLibrary& library);
+
+/// Where one of several sources that walk round the head is in this block: 7 degrees further than
+/// in the last one, which is fast (330 degrees a second at 1024), 1 to 3 m away. Left-handed,
+/// metres.
+Vector3 walk(int step, int source, int sources);
 
 /// One effect with its host buffers.
 class Played {
 public:
-    Played(const char* effect, std::uint32_t blockLength);
+    Played(const PluginLibrary& library, const char* effect, std::uint32_t blockLength);
 
     EffectInstance& effect() { return effect_; }
 
-    /// Puts the source by direction, degrees, and distance, metres.
-    void place(double azimuth, double elevation, double distance);
+    /// Puts the source somewhere, seen from the listener, metres.
+    void place(const Vector3& position);
 
     /// Noise of 0.25 peak from now on, or silence.
     void feed(bool noise);
