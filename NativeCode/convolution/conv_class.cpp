@@ -9,7 +9,9 @@
 #include "base/ess_error.h"
 #include "base/log.h"
 #include "base/process_lifetime.h"
+#include "convolution/sample_scan.h"
 #include "convolution/simd/kernels.h"
+#include "convolution/spectrum_stride.h"
 
 namespace tessaly {
 namespace {
@@ -47,38 +49,12 @@ void allocKeptSpectrum(ComplexBin*& slot, std::int32_t count) noexcept {
     }
 }
 
-/// Bins from one spectrum to the next: whole cache lines and no multiple of 4 KB.
-std::int32_t strideFor(std::int32_t bins) noexcept {
-    constexpr std::int32_t binsPerLine = 8;
-    constexpr std::int32_t binsPerPage = 512;
-    std::int32_t stride = (bins + binsPerLine - 1) / binsPerLine * binsPerLine;
-    if (stride % binsPerPage == 0) {
-        stride += binsPerLine;
-    }
-    return stride;
-}
-
 /// Points `entries` at consecutive spectra of one block; all null without memory for it.
 void carveSpectra(std::vector<ComplexBin*>& entries, ComplexBin*& memory, std::int32_t stride) {
     const std::int64_t bins = static_cast<std::int64_t>(entries.size()) * stride;
     allocSpectrum(memory, bins <= INT32_MAX ? static_cast<std::int32_t>(bins) : 0);
     for (std::size_t i = 0; memory != nullptr && i < entries.size(); ++i) {
         entries[i] = memory + static_cast<std::ptrdiff_t>(i) * stride;
-    }
-}
-
-/// y += x * gain, bin by bin.
-void addScaled(std::size_t bins, const ComplexBin* x, float gain, ComplexBin* y) noexcept {
-    for (std::size_t i = 0; i < bins; ++i) {
-        y[i].re += x[i].re * gain;
-        y[i].im += x[i].im * gain;
-    }
-}
-
-void carveTimeParts(std::vector<float*>& entries, AlignedArray<float>& memory, std::size_t length) {
-    memory = AlignedArray<float>(entries.size() * length);
-    for (std::size_t i = 0; i < entries.size(); ++i) {
-        entries[i] = memory.data() + i * length;
     }
 }
 
@@ -157,18 +133,16 @@ convClass::convClass(std::string instanceNameIn,
       // A partition count that wrapped below 1 leaves one partition.
       FDLtoBUFConv(std::max<std::int16_t>(partitions, 1)),
       partitionsAtCreation(FDLtoBUFConv),
-      stride_(strideFor(blockLengthIn + 1)) {
+      stride_(spectrumStride(blockLengthIn + 1)) {
     ++convInstanceCount;
     FDLpos = static_cast<std::int16_t>(FDLtoBUFConv - 1);
     // One accuracy serves all vector operations, so the mode is the choice of instruction set.
     kernels_ = &selectKernels();
 
     const auto count = static_cast<std::size_t>(FDLtoBUFConv);
-    const auto window = static_cast<std::size_t>(std::max(fftLength, 0));
     timePartsL.resize(count);
     timePartsR.resize(count);
-    carveTimeParts(timePartsL, timeMemoryL_, window);
-    carveTimeParts(timePartsR, timeMemoryR_, window);
+    keepTimeParts(isSecondInstance == 0 ? count : 0);
     fftOrder = fftLength > 0 ? 31 - std::countl_zero(static_cast<std::uint32_t>(fftLength)) : 0;
 
     FDL.resize(count);
@@ -183,15 +157,13 @@ convClass::convClass(std::string instanceNameIn,
     }
     allocSpectrum(accumL, binCount);
     allocSpectrum(accumR, binCount);
-    for (ComplexBin** const spectrum : {&partL_, &partR_, &endL_, &endR_}) {
-        allocSpectrum(*spectrum, binCount);
-    }
+    sums_.prepare(*kernels_, binCount, count);
+    allocSpectrum(end_.left, binCount);
+    allocSpectrum(end_.right, binCount);
     scaled_.begin = count;
     changed_.resize(count);
     silent_.resize(count);
-    chosenRing_.resize(count);
-    chosenLeft_.resize(count);
-    chosenRight_.resize(count);
+    ring_.prepare(count);
 
     dftiStatus = createFFT(fftHandle, fftLength);
     dftiStatus = createFFT(ifftHandle, fftLength);
@@ -216,14 +188,54 @@ convClass::~convClass() {
     }
     freeSpectrum(accumL);
     freeSpectrum(accumR);
-    for (ComplexBin** const spectrum : {&partL_, &partR_, &endL_, &endR_}) {
-        freeSpectrum(*spectrum);
+    freeSpectrum(end_.left);
+    freeSpectrum(end_.right);
+}
+
+void convClass::keepTimeParts(std::size_t partitions) {
+    const auto length = static_cast<std::size_t>(std::max(blockLength, 0));
+    const auto carve = [&](std::vector<float*>& entries, AlignedArray<float>& memory) {
+        memory = AlignedArray<float>(partitions * length);
+        for (std::size_t i = 0; i < entries.size(); ++i) {
+            entries[i] = i < partitions ? memory.data() + i * length : nullptr;
+        }
+    };
+    carve(timePartsL, timeMemoryL_);
+    carve(timePartsR, timeMemoryR_);
+}
+
+void convClass::watch(FirNotes* notes, std::int32_t compared) {
+    notes_ = notes;
+    if (notes != nullptr && blockLength > 0 && isSecondInstance == 0) {
+        const std::int32_t partitions = (std::max(compared, 0) + blockLength - 1) / blockLength;
+        keepTimeParts(std::min(static_cast<std::size_t>(partitions), timePartsL.size()));
     }
+}
+
+void convClass::splitFarTail(std::int32_t ratio) {
+    auto far = std::make_unique<FarTail>();
+    const auto count = static_cast<std::size_t>(FDLtoBUFConv);
+    if (isSecondInstance != 0 || directFilterFeed != 0 ||
+        !far->prepare(*kernels_, blockLength, count, ratio)) {
+        return;
+    }
+    // Where more than that is to be made up for, the uniform sum is no dearer.
+    const std::size_t corrections = (count - far->firstPartition()) / 4 + 1;
+    farHeld_.reserve(corrections);
+    farExpected_.reserve(corrections);
+    far_ = std::move(far);
 }
 
 void convClass::clearFDL() noexcept {
     for (ComplexBin* const spectrum : FDL) {
         clearSpectrum(spectrum, binCount - 1);
+    }
+    // While the ring is borrowed, its owner's knowledge of it is not this instance's.
+    if (isSecondInstance != 0 || FDL == FDLown) {
+        ring_.clear();
+    }
+    if (far_ != nullptr) {
+        far_->clear();
     }
 }
 
@@ -268,16 +280,43 @@ void convClass::transformHeadphoneFilter() noexcept {
 float* convClass::process() noexcept {
     watchSelection();
     // In a crossfade block the first instance works on the spectrum that the second one made.
-    if (!secondOLSactive || isSecondInstance != 0) {
-        dftiStatus = FFT(input, FDL[newestSlot()], fftHandle);
+    const bool borrowed = secondOLSactive && isSecondInstance == 0;
+    if (!borrowed) {
+        takeInput(blockNumber());
     }
     if ((filterChangeAll || forceUpdateAll) && isSecondInstance == 0) {
         updateFilter();
     }
-    accumulate();
-    dftiStatus = IFFT(accumL, outputL, ifftHandle);
-    dftiStatus = IFFT(accumR, outputR, ifftHandle);
+    advanceFarTail();
+    const RingView ring = borrowed ? RingView{FDL, nullptr, newestSlot()} : ownRing();
+    render(ring, partner_ != nullptr ? partner_->ownRing() : ring);
     return outputL;
+}
+
+/// The number of the block that is being made; 0 where nobody counts.
+std::uint64_t convClass::blockNumber() const noexcept {
+    return far_ != nullptr ? far_->block() + 1 : InputRing::noBlock;
+}
+
+/// A window of zeros has a spectrum of zeros.
+void convClass::takeInput(std::uint64_t block) noexcept {
+    const std::size_t slot = newestSlot();
+    ComplexBin* const spectrum = FDL[slot];
+    const bool silent = fftHandle != nullptr && input != nullptr && spectrum != nullptr &&
+                        allZero(input, static_cast<std::size_t>(fftLength));
+    if (silent) {
+        if (!ring_.silent(slot)) {
+            clearSpectrum(spectrum, binCount - 1);
+        }
+        dftiStatus = transformOk;
+    } else {
+        dftiStatus = FFT(input, spectrum, fftHandle);
+    }
+    ring_.set(slot, silent, dftiStatus == transformOk ? block : InputRing::noBlock);
+}
+
+convClass::RingView convClass::ownRing() const noexcept {
+    return {FDLown.empty() || isSecondInstance != 0 ? FDL : FDLown, &ring_, newestSlot()};
 }
 
 /// The engine writes the index; one outside of the ring is taken modulo N.
@@ -355,52 +394,66 @@ void convClass::findChangedPartitions() noexcept {
     }
     const ScaledPartitions next = scaledNow();
     const auto available = static_cast<std::size_t>(std::max(firBufferSize, 0));
-    const std::size_t bytes = length * sizeof(float);
+    const auto differs = [length](const float* kept, const float* fir, std::size_t start) {
+        return fir != nullptr &&
+               (kept == nullptr || std::memcmp(kept, fir + start, length * sizeof(float)) != 0);
+    };
     for (std::size_t i = first; i < end; ++i) {
         const std::size_t start = i * length;
         if (start + length > available) {
             break;
         }
-        const bool known =
-            (firL == nullptr || std::memcmp(timePartsL[i], firL + start, bytes) == 0) &&
-            (firR == nullptr || std::memcmp(timePartsR[i], firR + start, bytes) == 0);
         // One that joins or leaves the scaled end counts differently even with equal samples.
-        if (!known || fftHandle == nullptr || (i < scaled_.begin) != (i < next.begin)) {
+        if (differs(timePartsL[i], firL, start) || differs(timePartsR[i], firR, start) ||
+            fftHandle == nullptr || (i < scaled_.begin) != (i < next.begin)) {
             changed_[i] = 1;
             ++changedCount_;
+            if (far_ != nullptr && i >= far_->firstPartition()) {
+                far_->responseChanged();
+            }
         }
     }
-}
-
-convClass::ScaledPartitions convClass::scaledNow() const noexcept {
-    const std::size_t all = filterPartsL.size();
-    if (notes_ == nullptr || blockLength <= 0) {
-        return {all, 1.0f};
-    }
-    const ScaledEnd& end = notes_->scaledEnd;
-    const auto begin = static_cast<std::size_t>(std::max(end.begin, 0) / blockLength);
-    return {std::min(begin, all), end.gain};
 }
 
 void convClass::transformChanged() noexcept {
     scaled_ = scaledNow();
     const auto length = static_cast<std::size_t>(blockLength);
-    const auto take = [&](const float* fir, float* samples, ComplexBin* spectrum,
-                          std::size_t start) noexcept {
+    const auto take = [&](const float* fir, float* kept, ComplexBin* spectrum) noexcept {
         if (fir == nullptr) {
             return false;
         }
-        std::memcpy(samples, fir + start, length * sizeof(float));
-        dftiStatus = FFT(samples, spectrum, fftHandle);
-        return std::all_of(samples, samples + length, [](float x) { return x == 0.0f; });
+        if (kept != nullptr) {
+            std::memcpy(kept, fir, length * sizeof(float));
+        }
+        dftiStatus = halfFFT(fir, spectrum, fftHandle);
+        return allZero(fir, length);
     };
     for (std::size_t i = 0; i < changed_.size(); ++i) {
         if (changed_[i] != 0) {
-            const bool leftSilent = take(firL, timePartsL[i], filterPartsL[i], i * length);
-            const bool rightSilent = take(firR, timePartsR[i], filterPartsR[i], i * length);
+            const std::size_t start = i * length;
+            const bool leftSilent =
+                take(firL != nullptr ? firL + start : nullptr, timePartsL[i], filterPartsL[i]);
+            const bool rightSilent =
+                take(firR != nullptr ? firR + start : nullptr, timePartsR[i], filterPartsR[i]);
             silent_[i] = leftSilent && rightSilent && dftiStatus == transformOk ? 1 : 0;
         }
     }
+}
+
+/// The far tail is built from what the spectra were made of: a copy where there is one of all
+/// samples, the response itself where its writer tells of each change.
+void convClass::advanceFarTail() noexcept {
+    if (far_ == nullptr) {
+        return;
+    }
+    const bool copied = !timePartsL.empty() && timePartsL.back() != nullptr;
+    const float* const left = copied ? timeMemoryL_.data() : firL;
+    const float* const right = copied ? timeMemoryR_.data() : firR;
+    const auto near = static_cast<std::int32_t>(far_->firstPartition()) * blockLength;
+    if (!copied && notes_ != nullptr && !notes_->written.empty() && notes_->written.end > near) {
+        far_->responseChanged();  // written, but not taken yet
+    }
+    far_->advance(input, left, right);
 }
 
 /// Compensation of the whole response at once. Its handles are never created, so every transform
@@ -433,87 +486,170 @@ void convClass::multiplyHeadphone(const ComplexBin* filter,
 }
 
 /// A spectrum that memory failed for, or that was never lent, counts as zeros: the ear is silent.
-void convClass::accumulate() noexcept {
+bool convClass::canSum(const RingView& ring, bool compensated) const noexcept {
+    const auto present = [](const std::vector<ComplexBin*>& spectra) {
+        return std::find(spectra.begin(), spectra.end(), nullptr) == spectra.end();
+    };
+    const bool response = compensated ? hpTFspectrumL != nullptr && hpTFspectrumR != nullptr
+                                      : present(filterPartsL) && present(filterPartsR);
+    return accumulators().complete() && end_.complete() && sums_.ready() && response &&
+           present(ring.spectra);
+}
+
+/// One block from a ring with the spectra as they stand.
+void convClass::render(const RingView& ring, const RingView& other) noexcept {
     const bool compensated = hpTFactive && FDLtoBUFConv == 1;
-    const ComplexBin* const* const left = compensated ? &hpTFspectrumL : filterPartsL.data();
-    const ComplexBin* const* const right = compensated ? &hpTFspectrumR : filterPartsR.data();
-    const auto partitions = static_cast<std::size_t>(FDLtoBUFConv);
-    bool complete = accumL != nullptr && accumR != nullptr && hasSumMemory();
-    for (std::size_t i = 0; i < partitions; ++i) {
-        complete = complete && FDL[i] != nullptr && left[i] != nullptr && right[i] != nullptr;
-    }
-    if (!complete) {
-        clearSpectrum(accumL, binCount - 1);
-        clearSpectrum(accumR, binCount - 1);
+    farHeard_ = false;
+    const bool complete = canSum(ring, compensated);
+    if (complete && ring.state != nullptr && ring.state->silent() && ifftHandle != nullptr) {
+        renderSilence();
         return;
     }
-    if (compensated) {
-        kernels_->ringSum(static_cast<std::size_t>(binCount), partitions, newestSlot(), FDL.data(),
-                          left, right, accumL, accumR);
-        return;
-    }
-    accumulateFrom(*this);
-}
-
-bool convClass::hasSumMemory() const noexcept {
-    return partL_ != nullptr && partR_ != nullptr && endL_ != nullptr && endR_ != nullptr;
-}
-
-void convClass::accumulateFrom(const convClass& ring) noexcept {
+    resultSilent_ = false;
     clearSpectrum(accumL, binCount - 1);
     clearSpectrum(accumR, binCount - 1);
-    addSums(
-        ring, [](std::size_t) { return true; }, scaled_, accumL, accumR);
+    if (complete && compensated) {
+        sums_.begin();
+        sums_.add(ring.spectra[0], hpTFspectrumL, hpTFspectrumR);
+        sums_.store(accumulators());
+    } else if (complete) {
+        farHeard_ = findFarCorrections(ring, other, scaled_, scaled_);
+        const Layout layout = layoutOf(scaled_);
+        const auto all = [](std::size_t) { return true; };
+        collect(ring, 0, layout.scaledBegin, all);
+        sums_.addTo(accumulators());
+        collect(ring, layout.scaledBegin, layout.end, all);
+        addFarHeld();
+        sums_.addTo(accumulators(), layout.gain);
+        subtractFarExpected(accumulators(), layout.gain);
+    }
+    transformBack();
+    if (farHeard_) {
+        far_->addTo(outputL + blockLength, outputR + blockLength, layoutOf(scaled_).gain,
+                    blockLength);
+    }
 }
 
-/// Sum over chosen partitions of this instance's spectra with the ring of any. Partitions that are
-/// known to be zero are left out. @return false, and nothing written, if none is left
-template <typename Choice>
-bool convClass::sumOver(const convClass& ring,
-                        Choice&& chosen,
-                        ComplexBin* sumL,
-                        ComplexBin* sumR) noexcept {
-    const auto partitions = static_cast<std::size_t>(FDLtoBUFConv);
-    const std::size_t newest = ring.newestSlot();
-    std::size_t count = 0;
-    for (std::size_t i = 0; i < partitions; ++i) {
-        if (silent_[i] == 0 && chosen(i)) {
-            // Partition i meets the input of i blocks ago.
-            chosenRing_[count] = ring.FDL[(newest + partitions - i) % partitions];
-            chosenLeft_[count] = filterPartsL[i];
-            chosenRight_[count] = filterPartsR[i];
-            ++count;
+void convClass::transformBack() noexcept {
+    dftiStatus = IFFT(accumL, outputL, ifftHandle);
+    dftiStatus = IFFT(accumR, outputR, ifftHandle);
+}
+
+/// The results of a silent block are still there in the next one.
+void convClass::renderSilence() noexcept {
+    dftiStatus = transformOk;
+    for (float* const output : {outputL, outputR}) {
+        if (output != nullptr && !resultSilent_) {
+            std::fill_n(output, fftLength, 0.0f);
         }
     }
-    if (count == 0) {
+    resultSilent_ = true;
+}
+
+/// What the uniform sums cover in this block, and from where on with a gain. Without a gain of
+/// its end a response whose far tail is heard ends its uniform part there as well.
+convClass::Layout convClass::layoutOf(const ScaledPartitions& scaled) const noexcept {
+    const std::size_t end = farHeard_ ? far_->firstPartition() : filterPartsL.size();
+    return scaled.begin < end
+               ? Layout{scaled.begin, end, scaled.gain}
+               : Layout{end, end, scaled.begin < filterPartsL.size() ? scaled.gain : 1.0f};
+}
+
+/// Pairs the chosen partitions in [begin, end) with their inputs. What is known to be zero is left
+/// out.
+template <typename Choice>
+void convClass::collect(const RingView& ring,
+                        std::size_t begin,
+                        std::size_t end,
+                        Choice&& chosen) noexcept {
+    const auto partitions = static_cast<std::size_t>(FDLtoBUFConv);
+    sums_.begin();
+    for (std::size_t i = begin; i < end; ++i) {
+        if (silent_[i] != 0 || !chosen(i)) {
+            continue;
+        }
+        // Partition i meets the input of i blocks ago.
+        const std::size_t slot = (ring.newest + partitions - i) % partitions;
+        if (ring.state == nullptr || !ring.state->silent(slot)) {
+            sums_.add(ring.spectra[slot], filterPartsL[i], filterPartsR[i]);
+        }
+    }
+}
+
+/// Whether the far tail can stand for its partitions in this block: its response is that of the
+/// spectra, it is behind all samples without the gain of the end, and where a ring holds something
+/// else than the input as it came, which crossfade blocks bring about, the difference is known and
+/// small.
+bool convClass::findFarCorrections(const RingView& ring,
+                                   const RingView& other,
+                                   const ScaledPartitions& before,
+                                   const ScaledPartitions& now) noexcept {
+    farHeld_.clear();
+    farExpected_.clear();
+    if (far_ == nullptr || !far_->ready() || ring.state == nullptr) {
         return false;
     }
-    // The kernel pairs slot k of a ring with partition count - k.
-    std::reverse(chosenRing_.begin() + 1, chosenRing_.begin() + static_cast<std::ptrdiff_t>(count));
-    kernels_->ringSum(static_cast<std::size_t>(binCount), count, 0, chosenRing_.data(),
-                      chosenLeft_.data(), chosenRight_.data(), sumL, sumR);
+    const std::size_t partitions = filterPartsL.size();
+    const std::size_t first = far_->firstPartition();
+    for (const std::size_t begin : {before.begin, now.begin}) {
+        if (begin > first && begin < partitions) {
+            return false;
+        }
+    }
+    const std::uint64_t block = far_->block();
+    for (std::size_t i = first; i < partitions; ++i) {
+        const std::size_t slot = (ring.newest + partitions - i) % partitions;
+        const std::uint64_t expected = i < block ? block - i : InputRing::noBlock;
+        if (expected != InputRing::noBlock && ring.state->block(slot) == expected) {
+            continue;
+        }
+        if (silent_[i] != 0) {
+            continue;
+        }
+        if (!ring.state->silent(slot)) {
+            if (farHeld_.size() == farHeld_.capacity()) {
+                return false;
+            }
+            farHeld_.push_back({i, ring.spectra[slot]});
+        }
+        if (expected != InputRing::noBlock && !far_->silentBlock(expected)) {
+            if (other.state->block(slot) != expected ||
+                farExpected_.size() == farExpected_.capacity()) {
+                return false;
+            }
+            farExpected_.push_back({i, other.spectra[slot]});
+        }
+    }
     return true;
 }
 
-/// Adds the chosen partitions, those of the scaled end with its gain.
-template <typename Choice>
-void convClass::addSums(const convClass& ring,
-                        Choice&& chosen,
-                        const ScaledPartitions& scaled,
-                        ComplexBin* sumL,
-                        ComplexBin* sumR) noexcept {
-    const auto bins = static_cast<std::size_t>(binCount);
-    const std::size_t begin = scaled.begin;
-    if (sumOver(
-            ring, [&](std::size_t i) { return i < begin && chosen(i); }, partL_, partR_)) {
-        kernels_->add(bins, sumL, partL_, sumL);
-        kernels_->add(bins, sumR, partR_, sumR);
+void convClass::addFarHeld() noexcept {
+    if (farHeard_) {
+        for (const FarCorrection& held : farHeld_) {
+            sums_.add(held.spectrum, filterPartsL[held.partition], filterPartsR[held.partition]);
+        }
     }
-    if (sumOver(
-            ring, [&](std::size_t i) { return i >= begin && chosen(i); }, partL_, partR_)) {
-        addScaled(bins, partL_, scaled.gain, sumL);
-        addScaled(bins, partR_, scaled.gain, sumR);
+}
+
+void convClass::subtractFarExpected(const EarSpectra& sum, float gain) noexcept {
+    if (farHeard_ && !farExpected_.empty()) {
+        sums_.begin();
+        for (const FarCorrection& expected : farExpected_) {
+            sums_.add(expected.spectrum, filterPartsL[expected.partition],
+                      filterPartsR[expected.partition]);
+        }
+        sums_.addTo(sum, -gain);
     }
+}
+
+convClass::ScaledPartitions convClass::scaledNow() const noexcept {
+    const std::size_t all = filterPartsL.size();
+    if (notes_ == nullptr || blockLength <= 0) {
+        return {all, 1.0f};
+    }
+    const ScaledEnd& end = notes_->scaledEnd;
+    const auto begin = static_cast<std::size_t>(std::max(end.begin, 0) / blockLength);
+    return {std::min(begin, all), end.gain};
 }
 
 /// The plain order of a crossfade block, for all cases that the shared sum does not cover.
@@ -529,17 +665,12 @@ bool convClass::sharesWith(const convClass& second) const noexcept {
     if (hpTFactive && FDLtoBUFConv == 1) {
         return false;
     }
-    bool shares = directFilterFeed == 0 && isSecondInstance == 0 && second.isSecondInstance != 0 &&
-                  second.FDLtoBUFConv == FDLtoBUFConv && second.binCount == binCount &&
-                  second.newestSlot() == newestSlot() && fftHandle != nullptr &&
-                  second.fftHandle != nullptr && accumL != nullptr && accumR != nullptr &&
-                  second.accumL != nullptr && second.accumR != nullptr && hasSumMemory();
-    for (std::size_t i = 0; shares && i < FDL.size(); ++i) {
-        shares = second.FDL[i] != nullptr && filterPartsL[i] != nullptr &&
-                 filterPartsR[i] != nullptr && second.filterPartsL[i] == filterPartsL[i] &&
-                 second.filterPartsR[i] == filterPartsR[i];
-    }
-    return shares;
+    return directFilterFeed == 0 && isSecondInstance == 0 && second.isSecondInstance != 0 &&
+           second.FDLtoBUFConv == FDLtoBUFConv && second.binCount == binCount &&
+           second.newestSlot() == newestSlot() && fftHandle != nullptr && ifftHandle != nullptr &&
+           second.fftHandle != nullptr && second.ifftHandle != nullptr &&
+           second.accumulators().complete() && canSum(second.ownRing(), false) &&
+           second.filterPartsL == filterPartsL && second.filterPartsR == filterPartsR;
 }
 
 void convClass::processCrossfade(convClass& second, std::int32_t heardOfOld) noexcept {
@@ -547,8 +678,9 @@ void convClass::processCrossfade(convClass& second, std::int32_t heardOfOld) noe
         borrowAndProcess(second);
         return;
     }
+    partner_ = &second;
     second.watchSelection();
-    second.dftiStatus = FFT(second.input, second.FDL[newestSlot()], second.fftHandle);
+    second.takeInput(blockNumber());
     watchSelection();
     const bool update = filterChangeAll || forceUpdateAll;
     if (update && hpTFactive) {
@@ -560,47 +692,74 @@ void convClass::processCrossfade(convClass& second, std::int32_t heardOfOld) noe
         findChangedPartitions();
         scaled_ = scaledNow();
     }
-    const bool sameLevel = before.begin == scaled_.begin && before.gain == scaled_.gain;
-    if (changedCount_ == 0 && sameLevel) {
-        accumulateFrom(second);
-        dftiStatus = IFFT(accumL, outputL, ifftHandle);
-        dftiStatus = IFFT(accumR, outputR, ifftHandle);
-        const std::int32_t heard = std::clamp(heardOfOld, 0, blockLength);
+    advanceFarTail();
+    const RingView ring = second.ownRing();
+    const std::int32_t heard = std::clamp(heardOfOld, 0, blockLength);
+    if (changedCount_ > 0 && ring.state->silent()) {
+        transformChanged();
+        changedCount_ = 0;
+    }
+    if (ring.state->silent() || (changedCount_ == 0 && before == scaled_)) {
+        render(ring, ownRing());
         std::copy_n(outputL + blockLength, heard, second.outputL + blockLength);
         std::copy_n(outputR + blockLength, heard, second.outputR + blockLength);
         return;
     }
+    renderBoth(second, before, heard);
+}
 
-    // What both responses share: untouched partitions, and the end without its gain.
-    const std::size_t lastBegin = std::max(before.begin, scaled_.begin);
+/// Old and new response share what no update touched, and the end of them without its gain.
+void convClass::renderBoth(convClass& second,
+                           const ScaledPartitions& before,
+                           std::int32_t heard) noexcept {
+    const RingView ring = second.ownRing();
+    resultSilent_ = false;
+    farHeard_ = findFarCorrections(ring, ownRing(), before, scaled_);
+    const Layout old = layoutOf(before);
+    const Layout now = layoutOf(scaled_);
+    const std::size_t lastBegin = std::max(old.scaledBegin, now.scaledBegin);
+    const auto untouched = [this](std::size_t i) { return changed_[i] == 0; };
     const auto touched = [this](std::size_t i) { return changed_[i] != 0; };
-    const auto near = [&](std::size_t i) { return changed_[i] == 0 && i < lastBegin; };
-    const auto end = [&](std::size_t i) { return changed_[i] == 0 && i >= lastBegin; };
-    if (!sumOver(second, near, accumL, accumR)) {
+
+    collect(ring, 0, lastBegin, untouched);
+    if (!sums_.store(accumulators())) {
         clearSpectrum(accumL, binCount - 1);
         clearSpectrum(accumR, binCount - 1);
     }
-    const bool hasEnd = sumOver(second, end, endL_, endR_);
-    const auto addEnd = [&](float gain, ComplexBin* sumL, ComplexBin* sumR) {
-        if (hasEnd) {
-            addScaled(static_cast<std::size_t>(binCount), endL_, gain, sumL);
-            addScaled(static_cast<std::size_t>(binCount), endR_, gain, sumR);
+    collect(ring, lastBegin, old.end, untouched);
+    addFarHeld();
+    bool hasEnd = sums_.store(end_);
+    if (farHeard_ && !farExpected_.empty()) {
+        if (!hasEnd) {
+            clearSpectrum(end_.left, binCount - 1);
+            clearSpectrum(end_.right, binCount - 1);
         }
-    };
-
+        subtractFarExpected(end_, 1.0f);
+        hasEnd = true;
+    }
     const auto bins = static_cast<std::size_t>(binCount);
     std::copy_n(accumL, bins, second.accumL);
     std::copy_n(accumR, bins, second.accumR);
-    addSums(second, touched, before, second.accumL, second.accumR);
-    addEnd(before.gain, second.accumL, second.accumR);
-    second.dftiStatus = IFFT(second.accumL, second.outputL, second.ifftHandle);
-    second.dftiStatus = IFFT(second.accumR, second.outputR, second.ifftHandle);
+    const auto addOwn = [&](const Layout& layout, const EarSpectra& sum) {
+        collect(ring, 0, layout.scaledBegin, touched);
+        sums_.addTo(sum);
+        collect(ring, layout.scaledBegin, layout.end, touched);
+        sums_.addTo(sum, layout.gain);
+        if (hasEnd) {
+            sums_.addScaled(end_, layout.gain, sum);
+        }
+    };
 
+    addOwn(old, second.accumulators());
+    second.dftiStatus = middleIFFT(second.accumL, second.outputL, heard, second.ifftHandle);
+    second.dftiStatus = middleIFFT(second.accumR, second.outputR, heard, second.ifftHandle);
     transformChanged();
-    addSums(second, touched, scaled_, accumL, accumR);
-    addEnd(scaled_.gain, accumL, accumR);
-    dftiStatus = IFFT(accumL, outputL, ifftHandle);
-    dftiStatus = IFFT(accumR, outputR, ifftHandle);
+    addOwn(now, accumulators());
+    transformBack();
+    if (farHeard_) {
+        far_->addTo(second.outputL + blockLength, second.outputR + blockLength, old.gain, heard);
+        far_->addTo(outputL + blockLength, outputR + blockLength, now.gain, blockLength);
+    }
 }
 
 }  // namespace tessaly

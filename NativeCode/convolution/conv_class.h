@@ -2,11 +2,15 @@
 #pragma once
 
 #include <cstdint>
+#include <memory>
 #include <string>
 #include <vector>
 
 #include "base/aligned_array.h"
+#include "convolution/far_tail.h"
 #include "convolution/fir_notes.h"
+#include "convolution/input_ring.h"
+#include "convolution/partition_sums.h"
 #include "convolution/spectral_primitives.h"
 
 namespace tessaly {
@@ -98,8 +102,20 @@ public:
     void processCrossfade(convClass& second, std::int32_t heardOfOld) noexcept;
 
     /// Who writes the responses tells here which samples, taken and cleared by each update, and
-    /// whether their end has a gain. Null: all of them may have changed. Load time.
-    void watch(FirNotes* notes) noexcept { notes_ = notes; }
+    /// whether their end has a gain. Null: all of them may have changed. Load time: allocates.
+    /// @param compared  samples of the start that are often written again as they were: an update
+    ///                  looks for what differs there. Behind them all that is written counts as
+    ///                  changed, and no copy is kept
+    void watch(FirNotes* notes, std::int32_t compared);
+
+    /// Takes the far part of a long response in larger partitions, of `ratio` blocks, wherever that
+    /// gives the same: FarTail. Load time: allocates. Without memory all stays uniform.
+    void splitFarTail(std::int32_t ratio);
+    /// This block's far part came from larger partitions. For tests.
+    bool farTailHeard() const noexcept { return farHeard_; }
+
+    /// The last block's result is zeros for certain.
+    bool resultSilent() const noexcept { return resultSilent_; }
 
     /// Zeroes every spectrum in `FDL`. Block time.
     void clearFDL() noexcept;
@@ -129,7 +145,7 @@ public:
     float*& outputR;
     float*& firL;
     float*& firR;
-    /// Per partition 2B floats: the samples last transformed, then B zeros. With
+    /// Per partition the B samples last transformed; null where none are kept. With
     /// `directFilterFeed` entry 0 points at the engine's buffer, which stays the engine's.
     std::vector<float*> timePartsL;
     std::vector<float*> timePartsR;
@@ -177,43 +193,78 @@ private:
     static void multiplyHeadphone(const ComplexBin* filter,
                                   ComplexBin* product,
                                   std::int32_t bins) noexcept;
-    void accumulate() noexcept;
     void borrowAndProcess(convClass& second) noexcept;
     bool sharesWith(const convClass& second) const noexcept;
     void findChangedPartitions() noexcept;
     void transformChanged() noexcept;
+    void keepTimeParts(std::size_t partitions);
+
     /// How the end of the response counts: partitions from `begin` on, `gain` times.
     struct ScaledPartitions {
         std::size_t begin = 0;
         float gain = 1.0f;
+
+        bool operator==(const ScaledPartitions&) const = default;
+    };
+    /// A ring that a block is made from. Without a state nothing is known of its slots.
+    struct RingView {
+        const std::vector<ComplexBin*>& spectra;
+        const InputRing* state;
+        std::size_t newest;
     };
     ScaledPartitions scaledNow() const noexcept;
-    void accumulateFrom(const convClass& ring) noexcept;
-    bool hasSumMemory() const noexcept;
+    RingView ownRing() const noexcept;
+    EarSpectra accumulators() const noexcept { return {accumL, accumR}; }
+    void takeInput(std::uint64_t block) noexcept;
+    std::uint64_t blockNumber() const noexcept;
+    void advanceFarTail() noexcept;
+    bool canSum(const RingView& ring, bool compensated) const noexcept;
+    void render(const RingView& ring, const RingView& other) noexcept;
+    void renderSilence() noexcept;
+    void renderBoth(convClass& second, const ScaledPartitions& before, std::int32_t heard) noexcept;
+    void transformBack() noexcept;
+    /// Partitions [0, scaledBegin) of the uniform sums and [scaledBegin, end), which count `gain`
+    /// times, as does the far tail behind them.
+    struct Layout {
+        std::size_t scaledBegin;
+        std::size_t end;
+        float gain;
+    };
+    Layout layoutOf(const ScaledPartitions& scaled) const noexcept;
     template <typename Choice>
-    bool sumOver(const convClass& ring,
-                 Choice&& chosen,
-                 ComplexBin* sumL,
-                 ComplexBin* sumR) noexcept;
-    template <typename Choice>
-    void addSums(const convClass& ring,
-                 Choice&& chosen,
-                 const ScaledPartitions& scaled,
-                 ComplexBin* sumL,
-                 ComplexBin* sumR) noexcept;
+    void collect(const RingView& ring,
+                 std::size_t begin,
+                 std::size_t end,
+                 Choice&& chosen) noexcept;
+    bool findFarCorrections(const RingView& ring,
+                            const RingView& other,
+                            const ScaledPartitions& before,
+                            const ScaledPartitions& now) noexcept;
+    void addFarHeld() noexcept;
+    void subtractFarExpected(const EarSpectra& sum, float gain) noexcept;
 
     FirNotes* notes_ = nullptr;
     ScaledPartitions scaled_;            ///< of the spectra as they stand
     std::vector<std::uint8_t> changed_;  ///< per partition: its samples are not those transformed
     std::int32_t changedCount_ = 0;
     std::vector<std::uint8_t> silent_;  ///< per partition: both spectra are known to be zero
-    std::vector<const ComplexBin*> chosenRing_;
-    std::vector<const ComplexBin*> chosenLeft_;
-    std::vector<const ComplexBin*> chosenRight_;
-    ComplexBin* partL_ = nullptr;  ///< sums over a part of the partitions
-    ComplexBin* partR_ = nullptr;
-    ComplexBin* endL_ = nullptr;  ///< likewise, over the scaled end
-    ComplexBin* endR_ = nullptr;
+    InputRing ring_;                    ///< of the ring that this instance owns
+    bool resultSilent_ = false;
+
+    const convClass* partner_ = nullptr;  ///< the second instance, once a crossfade block met it
+    std::unique_ptr<FarTail> far_;
+    bool farHeard_ = false;
+    /// Slots of a ring that hold something else than the input as it came: what they hold counts,
+    /// what they should hold, which `far_` has counted, does not.
+    struct FarCorrection {
+        std::size_t partition;
+        const ComplexBin* spectrum;
+    };
+    std::vector<FarCorrection> farHeld_;
+    std::vector<FarCorrection> farExpected_;
+
+    PartitionSums sums_;
+    EarSpectra end_;  ///< sum over the scaled end, without its gain
 
     /// One block of memory for each array above; the stride between two spectra is whole cache
     /// lines and no multiple of 4 KB, so that neighbours do not share cache sets.

@@ -21,6 +21,8 @@ constexpr float ratioAt24000 = 0.5442177f;      // 24000 / 44100
 constexpr float ratioAt48000 = 1.0884354f;      // 48000 / 44100
 constexpr double firstDistanceOffset = 0.4;     // metres: the first block must see a change
 constexpr float firstInterpAngleOffset = 5.0f;  // degrees: the first blend takes the new buffer
+// A far tail takes memory of its own, which only long responses pay back.
+constexpr int fewestFarPartitions = 96;
 constexpr std::size_t debugDumpBytes = 8519680;
 constexpr const char* stopLine = "___tessCore_Stop";
 
@@ -230,7 +232,11 @@ void allocateBuffers(EngineState& state) {
 
 bool buildConvolvers(EngineState& state) {
     state.firstOLS = makeConvolver(state, "firstOLSfeeded-Instanz", false);
-    state.firstOLS->watch(&state.composer.notes);
+    state.firstOLS->watch(&state.composer.notes, FirComposer::comparedFrames);
+    if (state.sizes.fdlCount >= fewestFarPartitions && !state.switches.qvInterpolateFilters) {
+        state.firstOLS->splitFarTail(
+            FarTail::ratioFor(static_cast<std::size_t>(state.sizes.fdlCount)));
+    }
     if (state.switches.fading) {
         state.secondOLS = makeConvolver(state, "secondOLSfeeded-Instanz", true);
         shareSpectra(state);

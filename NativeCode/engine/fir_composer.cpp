@@ -21,8 +21,9 @@ constexpr int wallRecords = 6;  // the first records are walls, which a room may
 constexpr int shortestResponseWithTail = 4096;  // frames
 constexpr int syntheticTail = 1;                // the value of `qvReverb`
 constexpr int tailFadeFrames = 15;
-constexpr float widestHeldStep = 5.0f;      // degrees; a wider move composes the old pair anew
-constexpr int filteredStartFrames = 16384;  // behind a longer early part the tail is filtered anew
+constexpr float widestHeldStep = 5.0f;  // degrees; a wider move composes the old pair anew
+constexpr int filteredStartFrames =
+    FirComposer::comparedFrames;  // behind a longer early part the tail is filtered anew
 
 /// Frames of a stored pair that may be read.
 int readableFrames(int frames) noexcept { return std::clamp(frames, 0, hrirMaxLength); }
@@ -184,12 +185,15 @@ void FirComposer::composeFIR(float* left, float* right, CompositionInputs& input
     addTails(ears, inputs, reverbMixGain);
 }
 
-void FirComposer::writeWhole(const EarBuffers& ears, CompositionInputs& inputs) noexcept {
-    clearFrames(ears, ears.size);
+/// @param same  frames from here on are as they were: pieces end before, and the tail has not
+/// changed
+void FirComposer::writeWhole(const EarBuffers& ears, CompositionInputs& inputs, int same) noexcept {
+    // Without a tail there are zeros behind the pieces, old and new.
+    clearFrames(ears, hasTail(inputs) ? ears.size : same);
     writer_.write(ears, pieces_, inputs.sampleRate, inputs.reflections.reflectionFilter);
     addTails(ears, inputs, reverbMixGain);
     fadeFilterTail(inputs.sizes.FIR_size);
-    notes.written.include(0, ears.size);
+    notes.written.include(0, same);
     notes.scaledEnd = {ears.size, 1.0f};
 }
 
@@ -234,6 +238,8 @@ void FirComposer::composeChanges(CompositionInputs& inputs) noexcept {
         startKnown_ = false;
     }
     const bool samePieces = startKnown_ && pieces_ == lastPieces_;
+    const int piecesEnd =
+        std::clamp(std::max(pieces_.extent(), lastPieces_.extent()), 0, ears.size);
     lastPieces_ = pieces_;
 
     const bool measuredTail = hasTail(inputs) && inputs.switches.qvReverb != syntheticTail;
@@ -260,7 +266,7 @@ void FirComposer::composeChanges(CompositionInputs& inputs) noexcept {
     if (!measuredTail || blended || begin >= ears.size || begin > inputs.tail.startFrames(cutOff)) {
         const bool sameEnd = !hasTail(inputs) || (sameTail && sameGain && !synthetic);
         if (endKnown_ || !samePieces || !sameEnd) {
-            writeWhole(ears, inputs);
+            writeWhole(ears, inputs, startKnown_ && !endKnown_ && sameEnd ? piecesEnd : ears.size);
         }
         startKnown_ = true;
         endKnown_ = false;

@@ -39,6 +39,9 @@ struct CompositionInputs {
 
 class FirComposer {
 public:
+    /// Behind these frames nothing is written again that has not changed.
+    static constexpr int comparedFrames = 16384;
+
     /// Load time: allocates both responses.
     void prepare(int firBufferSize);
     /// Load time: allocates what spares filtering in later blocks.
@@ -84,7 +87,7 @@ private:
 
     void listPieces(CompositionInputs& inputs) noexcept;
     void composeChanges(CompositionInputs& inputs) noexcept;
-    void writeWhole(const EarBuffers& ears, CompositionInputs& inputs) noexcept;
+    void writeWhole(const EarBuffers& ears, CompositionInputs& inputs, int same) noexcept;
     void writeEnd(const EarBuffers& ears, CompositionInputs& inputs) noexcept;
     void writeStart(const EarBuffers& ears,
                     CompositionInputs& inputs,

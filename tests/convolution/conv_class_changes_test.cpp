@@ -17,6 +17,7 @@ constexpr std::int32_t heard = 16;
 struct Shape {
     std::int32_t blockLength;
     std::int16_t partitions;
+    std::int32_t farRatio = 0;  ///< 0: all partitions are of one length
 };
 
 bool sameSpectra(const std::vector<ComplexBin*>& a,
@@ -41,8 +42,11 @@ protected:
         plain.makeBoth();
         spared.makeBoth();
         spared.heardOfOld = heard;
-        spared.first->watch(&notes);
+        if (GetParam().farRatio > 0) {
+            spared.first->splitFarTail(GetParam().farRatio);
+        }
         const int size = static_cast<int>(spared.filterLeft.size());
+        spared.first->watch(&notes, size);
         notes.scaledEnd = {size, 1.0f};
         notes.written.include(0, size);
     }
@@ -94,6 +98,7 @@ protected:
             compare(plain.secondLeft, spared.secondLeft, heard);
             compare(plain.secondRight, spared.secondRight, heard);
         }
+        farBlocks += spared.first->farTailHeard() ? 1 : 0;
         const std::int32_t bins = spared.first->binCount;
         EXPECT_TRUE(sameSpectra(plain.first->FDLown, spared.first->FDLown, bins));
         EXPECT_TRUE(sameSpectra(plain.second->FDL, spared.second->FDL, bins));
@@ -116,6 +121,7 @@ protected:
     FirNotes notes;
     Noise noise{11};
     bool silent = false;
+    int farBlocks = 0;  ///< blocks whose far part came from larger partitions
     double largest = 0.0;
     double worst = 0.0;
 };
@@ -202,10 +208,83 @@ TEST_P(ChangingResponse, SamplesThatNobodyNotedAreNotTaken) {
               0);
 }
 
-INSTANTIATE_TEST_SUITE_P(
-    Shapes,
-    ChangingResponse,
-    testing::Values(Shape{32, 1}, Shape{32, 2}, Shape{16, 5}, Shape{64, 3}, Shape{32, 17}));
+/// A long response whose start changes all the time and whose end changes rarely, in runs of plain
+/// blocks and of crossfade blocks, through silences and a stop.
+TEST_P(ChangingResponse, FarTailInLargerPartitionsGivesTheSame) {
+    const int far = 2 * GetParam().farRatio * block();
+    write(0, size(), 0.5f);
+    setEnd(std::min(far, size()), 0.5f);
+    bool updates = true;
+    const int blocks = 12 * GetParam().partitions;
+    for (int n = 0; n < blocks; ++n) {
+        SCOPED_TRACE(n);
+        const int kind = static_cast<int>(noise.samples(1)[0] * 1000.0f + 1000.0f) % 64;
+        if (kind < 24) {
+            write(0, block(), 0.5f);
+        } else if (kind < 28) {
+            setEnd(notes.scaledEnd.begin, noise());
+        } else if (kind == 28) {
+            updates = !updates;
+        } else if (kind == 29) {
+            silent = !silent;
+        } else if (kind == 30 && n % 3 == 0) {  // the far end
+            write(size() - 3 * block(), size() - block(), 0.5f);
+        } else if (kind == 31 && n % 3 == 0) {
+            for (ConvolverRig* const rig : {&plain, &spared}) {
+                rig->first->clearFDL();
+                rig->second->clearFDL();
+                std::ranges::fill(rig->window, 0.0f);
+            }
+        } else if (kind == 32 && n % 5 == 0) {  // a window that does not follow the one before
+            for (ConvolverRig* const rig : {&plain, &spared}) {
+                std::ranges::fill(rig->window, 0.25f);
+            }
+        }
+        run(n == 0 || updates);
+    }
+    ASSERT_GT(largest, 0.0);
+    EXPECT_LT(worst / largest, 1e-6);
+    if (GetParam().farRatio > 0) {
+        EXPECT_GT(farBlocks, blocks / 4) << "else this compares nothing";
+    } else {
+        EXPECT_EQ(farBlocks, 0);
+    }
+}
+
+class ChangingFarTail : public ChangingResponse {};
+
+TEST_P(ChangingFarTail, MakesUpForBlocksThatARingHasMissed) {
+    write(0, size(), 0.5f);
+    const int partitions = GetParam().partitions;
+    for (int n = 0; n < 3 * partitions; ++n) {
+        run(true);
+    }
+    EXPECT_TRUE(spared.first->farTailHeard());
+    for (int n = 0; n < 2; ++n) {
+        run(false);  // the crossfade blocks' ring misses these
+    }
+    for (int n = 0; n < partitions; ++n) {
+        run(true);
+        EXPECT_TRUE(spared.first->farTailHeard()) << n;
+    }
+    ASSERT_GT(largest, 0.0);
+    EXPECT_LT(worst / largest, 1e-6);
+}
+
+INSTANTIATE_TEST_SUITE_P(Shapes,
+                         ChangingResponse,
+                         testing::Values(Shape{32, 1},
+                                         Shape{32, 2},
+                                         Shape{16, 5},
+                                         Shape{64, 3},
+                                         Shape{32, 17},
+                                         Shape{32, 48, 4},
+                                         Shape{16, 90, 8},
+                                         Shape{64, 33, 4}));
+
+INSTANTIATE_TEST_SUITE_P(Shapes,
+                         ChangingFarTail,
+                         testing::Values(Shape{32, 48, 4}, Shape{16, 90, 8}, Shape{64, 33, 4}));
 
 }  // namespace
 }  // namespace tessaly::test
