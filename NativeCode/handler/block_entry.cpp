@@ -1,12 +1,14 @@
 // One block of one handler: host values to engine values, then render, bypass or silence.
 #include <algorithm>
+#include <bit>
 #include <cmath>
 
 #include "base/ess_error.h"
+#include "base/even_slots.h"
 #include "base/log.h"
 #include "base/numeric_conversion.h"
 #include "base/precision.h"
-#include "base/units.h"
+#include "base/silence.h"
 #include "handler/block_copy.h"
 #include "handler/instance_handler.h"
 #include "handler/process_state.h"
@@ -64,6 +66,7 @@ void bypassBlock(const float* in,
 
 std::uint8_t InstanceHandler::processBlock(
     const float* in, float* out, std::uint32_t length, int inchannels, int outchannels) noexcept {
+    inputSilent_ = false;
     updatePosition();
     if (internalMute) {
         logTrace("WARNING: internalMute == true so no dataSet from GUI!!!");
@@ -87,7 +90,12 @@ std::uint8_t InstanceHandler::processBlock(
 }
 
 void InstanceHandler::updatePosition() noexcept {
-    azimuthIn = bendAzimuth(azimuth, angleExponent);
+    const auto azimuthBits = std::bit_cast<std::uint32_t>(azimuth);
+    const auto exponentBits = std::bit_cast<std::uint32_t>(angleExponent);
+    if (azimuthBits != bentAzimuth_.azimuthBits || exponentBits != bentAzimuth_.exponentBits) {
+        bentAzimuth_ = {azimuthBits, exponentBits, bendAzimuth(azimuth, angleExponent)};
+    }
+    azimuthIn = bentAzimuth_.azimuth;
     distanceIn = distanceScale * distance;
     elevationIn = truncateToInt16(elevation);
 }
@@ -105,9 +113,9 @@ void InstanceHandler::updateMixValues() noexcept {
         gainDb = masterGainDb;
     }
 
-    mixParameters.directGain = decibelsToLinear(directGainDb);
-    mixParameters.earlyGain = decibelsToLinear(earlyGainDb);
-    mixParameters.reverbGain = decibelsToLinear(reverbGainDb);
+    mixParameters.directGain = directLevel_.of(directGainDb);
+    mixParameters.earlyGain = earlyLevel_.of(earlyGainDb);
+    mixParameters.reverbGain = reverbLevel_.of(reverbGainDb);
     applyUnityDistance();
     if (engine != nullptr) {
         updateLiveControls(*engine);
@@ -182,6 +190,13 @@ void InstanceHandler::renderBlock(
                   " not existing (yet) cause pluginIDinc is ", pluginId);
         return;
     }
+    if (out != nullptr && outchannels == 2 && length == blockCapacity) {
+        // A whole block needs no copy. The input is out of the engine's way, also where the host
+        // has one buffer for both.
+        float* target = out;
+        engine->comProcessing(inputBlock, target, activeInstance);
+        return;
+    }
     engine->comProcessing(inputBlock, outputBlock, activeInstance);
     copyOrZero(outputBlock, outputStorage.size(), out, wanted);
 }
@@ -190,14 +205,28 @@ void InstanceHandler::fillInputBlock(const float* in,
                                      std::uint32_t length,
                                      int inchannels,
                                      int outchannels) noexcept {
-    if (in == nullptr || inchannels <= 0) {
+    const bool none = in == nullptr || inchannels <= 0;
+    // A flat copy into more than two channels may take more of the input than its first two.
+    inputSilent_ =
+        none || (outchannels <= 2 && isSilent(in, floatsIn(length, std::min(inchannels, 2))));
+    if (inputSilent_ && inputBlockSilent_) {
+        return;
+    }
+    copyInput(none ? nullptr : in, length, inchannels, outchannels);
+    // What is on the odd slots, or behind a shorter block, need not be silent.
+    inputBlockSilent_ = inputSilent_ && isSilent(inputBlock, inputStorage.size());
+}
+
+void InstanceHandler::copyInput(const float* in,
+                                std::uint32_t length,
+                                int inchannels,
+                                int outchannels) noexcept {
+    if (in == nullptr) {
         std::fill_n(inputBlock, 2 * static_cast<std::size_t>(length), 0.0f);
         return;
     }
     if (inchannels == 1) {
-        for (std::size_t i = 0; i < length; ++i) {
-            inputBlock[2 * i] = in[i];
-        }
+        spreadToEven(in, length, inputBlock);
         return;
     }
     // What is no number, or overflows, would stay in the engine's recursive filters for good, so it
@@ -208,9 +237,7 @@ void InstanceHandler::fillInputBlock(const float* in,
         return;
     }
     const float w = (inputChannel + 1.0f) * 0.5f;
-    for (std::size_t i = 0; i < length; ++i) {
-        inputBlock[2 * i] = in[2 * i] * (1.0f - w) + in[2 * i + 1] * w;
-    }
+    blendToEven(in, length, 1.0f - w, w, inputBlock);
 }
 
 void InstanceHandler::muteBlock(float* out, std::uint32_t length, int outchannels) noexcept {

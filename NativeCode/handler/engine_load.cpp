@@ -153,6 +153,7 @@ void InstanceHandler::allocateBlocks() {
     outputStorage = AlignedArray<float>(2 * static_cast<std::size_t>(blockCapacity));
     inputBlock = inputStorage.data();
     outputBlock = outputStorage.data();
+    inputBlockSilent_ = true;
     overlongReported = false;
 }
 

@@ -8,6 +8,7 @@
 
 #include "base/aligned_array.h"
 #include "base/audio_thread.h"
+#include "base/linear_level.h"
 #include "engine/engine_settings.h"
 #include "engine/spatial_engine.h"
 
@@ -54,6 +55,9 @@ public:
         const auto slot = static_cast<std::size_t>(activeInstance);
         return slot < instance.size() ? instance[slot].get() : nullptr;
     }
+
+    /// The last call of `processBlock` rendered an input of nothing but zeros. Block time.
+    bool inputWasSilent() const noexcept TESSALY_NONBLOCKING { return inputSilent_; }
 
     // ---- Engine slots and load state ----
 
@@ -160,8 +164,26 @@ private:
                         std::uint32_t length,
                         int inchannels,
                         int outchannels) noexcept TESSALY_NONBLOCKING;
+    void copyInput(const float* in,
+                   std::uint32_t length,
+                   int inchannels,
+                   int outchannels) noexcept TESSALY_NONBLOCKING;
     void muteBlock(float* out, std::uint32_t length, int outchannels) noexcept;
 
+    /// `azimuthIn` of an azimuth that is bent, kept for as long as both values stay.
+    struct BentAzimuth {
+        std::uint32_t azimuthBits = 0;
+        std::uint32_t exponentBits = 0;
+        std::int16_t azimuth = 0;  ///< 0 degrees stay 0 by any exponent
+    };
+
+    BentAzimuth bentAzimuth_;
+    LinearLevel directLevel_;
+    LinearLevel earlyLevel_;
+    LinearLevel reverbLevel_;
+    bool inputSilent_ = false;
+    /// `inputBlock` holds nothing but zeros.
+    bool inputBlockSilent_ = false;
     AlignedArray<float> inputStorage;
     AlignedArray<float> outputStorage;
     /// Frames that the two blocks hold: `blocklenght`, or 0 where that cannot be an engine's.

@@ -173,7 +173,10 @@ int TESSALY_HOST_CALL reverbProcess(UnityAudioEffectState* state,
         return callbackOk;
     }
     effect->lastResult = handler.processBlock(mix->data(), outbuffer, length, 2, 2);
-    std::fill_n(mix->begin(), wanted, 0.0f);
+    // A return that nobody plays to finds zeros and leaves them.
+    if (!handler.inputWasSilent()) {
+        std::fill_n(mix->begin(), wanted, 0.0f);
+    }
     return callbackOk;
 }
 

@@ -3,6 +3,7 @@
 
 #include <algorithm>
 
+#include "base/even_slots.h"
 #include "base/log.h"
 #include "base/process_lifetime.h"
 
@@ -53,13 +54,9 @@ void addToMixBuffer(ReverbMixBuffer& mix,
                     float gain) noexcept {
     const std::size_t count = std::min(frames, mixBufferFrames);
     if (inchannels == 2) {
-        for (std::size_t i = 0; i < count; ++i) {
-            mix[2 * i] += (in[2 * i] + in[2 * i + 1]) * gain;
-        }
+        addSumsToEven(in, count, gain, mix.data());
     } else if (inchannels == 1) {
-        for (std::size_t i = 0; i < count; ++i) {
-            mix[2 * i] += in[i] * gain;
-        }
+        addToEven(in, count, gain, mix.data());
     }
 }
 

@@ -1,7 +1,9 @@
 // Azimuth and elevation of a source.
 #include "host/source_angles.h"
 
+#include <algorithm>
 #include <cmath>
+#include <cstring>
 
 namespace tessaly {
 
@@ -44,6 +46,19 @@ SourceAngles sourceAngles(const float* listenermatrix, const float* sourcematrix
     const float elevation =
         std::atan2(y, std::sqrt(z * z + x * x) + overheadOffset) * degreesPerRadian;
     return {azimuth, elevation};
+}
+
+const SourceAngles& KeptSourceAngles::of(const float* listenermatrix,
+                                         const float* sourcematrix) noexcept {
+    const float* const position = sourcematrix + 12;
+    if (!known_ || std::memcmp(position, source_.data(), sizeof source_) != 0 ||
+        std::memcmp(listenermatrix, listener_.data(), sizeof listener_) != 0) {
+        std::copy_n(listenermatrix, listener_.size(), listener_.begin());
+        std::copy_n(position, source_.size(), source_.begin());
+        angles_ = sourceAngles(listenermatrix, sourcematrix);
+        known_ = true;
+    }
+    return angles_;
 }
 
 }  // namespace tessaly

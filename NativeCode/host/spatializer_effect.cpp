@@ -7,12 +7,11 @@
 #include "base/flush_denormals.h"
 #include "base/log.h"
 #include "base/numeric_conversion.h"
-#include "base/units.h"
+#include "base/silence.h"
 #include "handler/block_copy.h"
 #include "handler/process_state.h"
 #include "host/effect_registry.h"
 #include "host/reverb_mix_buffers.h"
-#include "host/source_angles.h"
 
 namespace tessaly {
 
@@ -145,8 +144,8 @@ void sendToReverbs(SpatializerEffect& effect,
         in == nullptr) {
         return;
     }
-    const float reverbGain = decibelsToLinear(handler.reverbGainDb);
-    const float masterGain = decibelsToLinear(handler.masterGainDb);
+    const float reverbGain = effect.sendReverbGain.of(handler.reverbGainDb);
+    const float masterGain = effect.sendMasterGain.of(handler.masterGainDb);
     const float distanceGain = sendDistanceGain(handler);
 
     const std::size_t count =
@@ -156,17 +155,22 @@ void sendToReverbs(SpatializerEffect& effect,
         effect.reverbSends.push_back(
             {effect.reverbSendId[i], static_cast<float>(effect.reverbSendDb[i])});
     }
-    for (const ReverbSend& send : effect.reverbSends) {
+    // Silence adds nothing; any other channel count than these two neither.
+    const bool adds =
+        (inchannels == 1 || inchannels == 2) && !isSilent(in, floatsIn(length, inchannels));
+    for (std::size_t i = 0; i < count; ++i) {
+        const ReverbSend& send = effect.reverbSends[i];
         ReverbMixBuffer* mix = findMixBuffer(send.id);
         if (mix == nullptr) {
             logTrace("Tessaly_s: Reverb ID ", send.id,
                      " does not exist in Tessaly Reverb Plugins ");
             continue;
         }
-        const float gain = decibelsToLinear(send.levelDb) * reverbGain * masterGain * distanceGain;
+        const float gain =
+            effect.sendGains[i].of(send.levelDb) * reverbGain * masterGain * distanceGain;
         // One source without a proper level must not spoil the reverb of all others: whatever is
         // no number, or would overflow on its way through the return, is dropped.
-        if (std::fabs(gain) <= highestSendGain) {
+        if (adds && std::fabs(gain) <= highestSendGain) {
             addToMixBuffer(*mix, in, length, inchannels, gain);
         }
     }
@@ -270,7 +274,7 @@ int TESSALY_HOST_CALL spatializerProcess(UnityAudioEffectState* state,
     handler.checkForChanges(static_cast<int>(state->samplerate), buffersizeSpat);
 
     const UnityAudioSpatializerData& spatial = *state->spatializerdata;
-    const SourceAngles angles = sourceAngles(spatial.listenermatrix, spatial.sourcematrix);
+    const SourceAngles& angles = effect->angles.of(spatial.listenermatrix, spatial.sourcematrix);
     handler.azimuth = angles.azimuth;
     handler.elevation = angles.elevation;
 

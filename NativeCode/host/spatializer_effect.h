@@ -7,9 +7,11 @@
 #include <memory>
 #include <vector>
 
+#include "base/linear_level.h"
 #include "handler/instance_handler.h"
 #include "host/audio_plugin_interface.h"
 #include "host/parameter_tables.h"
+#include "host/source_angles.h"
 
 namespace tessaly {
 
@@ -33,6 +35,13 @@ struct SpatializerEffect {
     std::int32_t reverbSendCount = 0;  ///< "Reverb Size", unchecked
     std::array<std::int32_t, maximumSends> reverbSendId{};
     std::array<std::int32_t, maximumSends> reverbSendDb{};  ///< whole dB
+
+    // What Process keeps from block to block.
+
+    KeptSourceAngles angles;
+    LinearLevel sendReverbGain;
+    LinearLevel sendMasterGain;
+    std::array<LinearLevel, maximumSends> sendGains;
 };
 
 /// Spatializers created so far, never less. Written by Create.

@@ -238,6 +238,26 @@ TEST_F(ReverbEffectTest, RendersTheSendsAtHalfLevelAndEmptiesTheBuffer) {
     EXPECT_EQ(effect().lastResult, 1);
 }
 
+TEST_F(ReverbEffectTest, EmptiesTheBufferWhateverWasInItBefore) {
+    load();
+    const auto heard = [&] { return fakeEngines().last().blocks.back().input; };
+    ReverbMixBuffer& mix = *findMixBuffer(5);
+    for (const int round : {0, 1, 2}) {
+        SCOPED_TRACE(round);
+        for (const std::size_t slot : {0u, 1u, 2 * frames - 2, 2 * frames - 1}) {
+            EXPECT_EQ(run(countedSamples(2 * frames)), silence) << "nobody sends";
+            EXPECT_EQ(heard(), silence);
+            mix[slot] = 1.0f;
+            run(countedSamples(2 * frames));
+            EXPECT_EQ(heard()[slot - slot % 2], 0.5f) << slot;
+            EXPECT_EQ(mix, ReverbMixBuffer{}) << slot;
+        }
+        mix[0] = -0.0f;
+        run(countedSamples(2 * frames));
+        EXPECT_FALSE(std::signbit(mix[0]));
+    }
+}
+
 TEST_F(ReverbEffectTest, TheRoomStaysNineMetresAhead) {
     load();
     run(countedSamples(2 * frames));

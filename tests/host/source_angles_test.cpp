@@ -6,6 +6,7 @@
 #include <array>
 #include <cmath>
 #include <cstddef>
+#include <cstring>
 #include <limits>
 
 #include "base/numeric_conversion.h"
@@ -117,6 +118,33 @@ TEST(SourceAngles, RoundsInTheOrderOfItsTerms) {
     EXPECT_NEAR(sourceAngles(listener.data(), source.data()).azimuth, 45.0, 1e-4);
     const Matrix swapped = {1, 0, 0, 0, 1e8f, 0, 0, 0, -1e8f, 0, 0, 0, 0, 0, 1, 1};
     EXPECT_EQ(sourceAngles(swapped.data(), source.data()).azimuth, 0.0f);
+}
+
+TEST(SourceAngles, KeptOnesFollowEveryValueThatMoves) {
+    KeptSourceAngles kept;
+    Matrix listener = identity();
+    Matrix source = identity();
+    const auto expectFresh = [&](const char* what, std::size_t index) {
+        const SourceAngles fresh = sourceAngles(listener.data(), source.data());
+        for (int round = 0; round < 2; ++round) {
+            const SourceAngles& angles = kept.of(listener.data(), source.data());
+            EXPECT_EQ(std::memcmp(&angles, &fresh, sizeof fresh), 0) << what << " " << index;
+        }
+    };
+    source[12] = 1.0f;
+    source[13] = 2.0f;
+    source[14] = 3.0f;
+    constexpr float nan = std::numeric_limits<float>::quiet_NaN();
+    expectFresh("start", 0);
+    for (std::size_t index = 0; index < 16; ++index) {
+        for (Matrix* const matrix : {&listener, &source}) {
+            const float before = (*matrix)[index];
+            for (const float value : {before + 0.25f, nan, before}) {
+                (*matrix)[index] = value;
+                expectFresh(matrix == &listener ? "listener" : "source", index);
+            }
+        }
+    }
 }
 
 TEST(SourceAngles, EveryMatrixGivesAnAngleOrNoNumber) {

@@ -591,6 +591,46 @@ TEST_F(SpatializerEffectTest, ALevelThatIsNoNumberDoesNotReachTheReverb) {
     EXPECT_EQ(reverbmixbuffermap[5][0], 1.0f) << "sends again with proper levels";
 }
 
+TEST_F(SpatializerEffectTest, SendsFollowEveryChangeOfLevelsAndInput) {
+    prepareSend();
+    changeMixId(7);
+    const std::vector<float> sound = countedSamples(frames);
+    const std::vector<float> nothing(2 * frames, 0.0f);
+    std::vector<float> late = nothing;
+    late.back() = 1.0f;
+    for (const float db : {0.0f, -12.0f, -12.0f, 3.0f, 0.0f}) {
+        SCOPED_TRACE(db);
+        set(P_REVERB_SIZE, 2.0f);
+        for (const auto& [id, level] : {std::pair{5.0f, db}, {7.0f, -db}}) {
+            set(P_SEND_REVERB_ID, id);
+            set(P_REVERB_SEND, level);
+        }
+        set(P_GAIN, db * 0.5f);
+        const auto gainOf = [&](float level) {
+            return std::pow(10.0f, level * 0.05f) * std::pow(10.0f, 0.0f * 0.05f) *
+                   std::pow(10.0f, db * 0.5f * 0.05f) * 1.0f;
+        };
+        changeMixId(5);
+        changeMixId(7);
+        run(sound, 1);
+        run(nothing, 2);
+        run(nothing, 1);
+        run(late, 2);
+        run(sound, 1);
+        for (const auto& [id, level] : {std::pair{5, db}, {7, -db}}) {
+            const float gain = gainOf(level);
+            for (std::size_t i = 0; i < frames; ++i) {
+                float wanted = 0.0f;
+                wanted += sound[i] * gain;
+                wanted += (late[2 * i] + late[2 * i + 1]) * gain;
+                wanted += sound[i] * gain;
+                EXPECT_EQ(reverbmixbuffermap[id][2 * i], wanted) << id << " at " << i;
+                EXPECT_EQ(reverbmixbuffermap[id][2 * i + 1], 0.0f);
+            }
+        }
+    }
+}
+
 TEST_F(SpatializerEffectTest, ASendOfALongBlockStaysInItsBuffer) {
     prepareSend();
     const std::uint32_t tooLong = 5000;
