@@ -232,7 +232,9 @@ void allocateBuffers(EngineState& state) {
 
 bool buildConvolvers(EngineState& state) {
     state.firstOLS = makeConvolver(state, "firstOLSfeeded-Instanz", false);
-    state.firstOLS->watch(&state.composer.notes, FirComposer::comparedFrames);
+    // Blended responses are written whole, and little of them differs from block to block.
+    state.firstOLS->watch(&state.composer.notes,
+                          state.switches.qvInterpolateFilters ? state.sizes.firBufferSize : 0);
     if (state.sizes.fdlCount >= fewestFarPartitions && !state.switches.qvInterpolateFilters) {
         state.firstOLS->splitFarTail(
             FarTail::ratioFor(static_cast<std::size_t>(state.sizes.fdlCount)));

@@ -21,9 +21,8 @@ constexpr int wallRecords = 6;  // the first records are walls, which a room may
 constexpr int shortestResponseWithTail = 4096;  // frames
 constexpr int syntheticTail = 1;                // the value of `qvReverb`
 constexpr int tailFadeFrames = 15;
-constexpr float widestHeldStep = 5.0f;  // degrees; a wider move composes the old pair anew
-constexpr int filteredStartFrames =
-    FirComposer::comparedFrames;  // behind a longer early part the tail is filtered anew
+constexpr float widestHeldStep = 5.0f;      // degrees; a wider move composes the old pair anew
+constexpr int filteredStartFrames = 16384;  // behind a longer early part the tail is filtered anew
 
 /// Frames of a stored pair that may be read.
 int readableFrames(int frames) noexcept { return std::clamp(frames, 0, hrirMaxLength); }
@@ -185,15 +184,18 @@ void FirComposer::composeFIR(float* left, float* right, CompositionInputs& input
     addTails(ears, inputs, reverbMixGain);
 }
 
-/// @param same  frames from here on are as they were: pieces end before, and the tail has not
-/// changed
-void FirComposer::writeWhole(const EarBuffers& ears, CompositionInputs& inputs, int same) noexcept {
-    // Without a tail there are zeros behind the pieces, old and new.
-    clearFrames(ears, hasTail(inputs) ? ears.size : same);
+/// @param piecesEnd  pieces end before, in this response and in the one that stands there
+/// @param changed    frames that may differ from what stands there
+void FirComposer::writeWhole(const EarBuffers& ears,
+                             CompositionInputs& inputs,
+                             int piecesEnd,
+                             FrameRange changed) noexcept {
+    // Without a tail there are zeros behind the pieces.
+    clearFrames(ears, hasTail(inputs) ? ears.size : piecesEnd);
     writer_.write(ears, pieces_, inputs.sampleRate, inputs.reflections.reflectionFilter);
     addTails(ears, inputs, reverbMixGain);
     fadeFilterTail(inputs.sizes.FIR_size);
-    notes.written.include(0, same);
+    notes.written.include(changed.begin, changed.end);
     notes.scaledEnd = {ears.size, 1.0f};
 }
 
@@ -213,14 +215,15 @@ void FirComposer::writeEnd(const EarBuffers& ears, CompositionInputs& inputs) no
 void FirComposer::writeStart(const EarBuffers& ears,
                              CompositionInputs& inputs,
                              int end,
-                             float gain) noexcept {
+                             float gain,
+                             FrameRange changed) noexcept {
     const LiveControls& controls = inputs.controls;
     clearFrames(ears, end);
     writer_.write(ears, pieces_, inputs.sampleRate, inputs.reflections.reflectionFilter);
     inputs.tail.addStart(ears.left, ears.right, end, controls.reverbLP_Fc, gain);
     inputs.tail.cutToRoomSize(ears.left, ears.right, end, controls.roomSizeFactor);
     fadeFilterTail(inputs.sizes.FIR_size, end);
-    notes.written.include(0, end);
+    notes.written.include(changed.begin, changed.end);
 }
 
 /// The engine's own responses: what composeFIR and fadeFilterTail give, of which only that is made
@@ -238,8 +241,12 @@ void FirComposer::composeChanges(CompositionInputs& inputs) noexcept {
         startKnown_ = false;
     }
     const bool samePieces = startKnown_ && pieces_ == lastPieces_;
-    const int piecesEnd =
-        std::clamp(std::max(pieces_.extent(), lastPieces_.extent()), 0, ears.size);
+    const FrameRange everything{0, ears.size};
+    const int lastEnd = std::max(pieces_.extent(), lastPieces_.extent());
+    const int piecesEnd = startKnown_ && !endKnown_ ? std::clamp(lastEnd, 0, ears.size) : ears.size;
+    const FrameRange differences = pieces_.differencesTo(lastPieces_);
+    const FrameRange changedPieces{std::clamp(differences.begin, 0, ears.size),
+                                   std::clamp(differences.end, 0, ears.size)};
     lastPieces_ = pieces_;
 
     const bool measuredTail = hasTail(inputs) && inputs.switches.qvReverb != syntheticTail;
@@ -266,7 +273,8 @@ void FirComposer::composeChanges(CompositionInputs& inputs) noexcept {
     if (!measuredTail || blended || begin >= ears.size || begin > inputs.tail.startFrames(cutOff)) {
         const bool sameEnd = !hasTail(inputs) || (sameTail && sameGain && !synthetic);
         if (endKnown_ || !samePieces || !sameEnd) {
-            writeWhole(ears, inputs, startKnown_ && !endKnown_ && sameEnd ? piecesEnd : ears.size);
+            writeWhole(ears, inputs, piecesEnd,
+                       startKnown_ && !endKnown_ && sameEnd ? changedPieces : everything);
         }
         startKnown_ = true;
         endKnown_ = false;
@@ -278,7 +286,9 @@ void FirComposer::composeChanges(CompositionInputs& inputs) noexcept {
         endKnown_ = true;
     }
     if (!sameEnd || !samePieces || !sameGain || begin != notes.scaledEnd.begin) {
-        writeStart(ears, inputs, begin, gain);
+        const bool sameFrames =
+            sameEnd && sameGain && startKnown_ && begin == notes.scaledEnd.begin;
+        writeStart(ears, inputs, begin, gain, sameFrames ? changedPieces : FrameRange{0, begin});
         startKnown_ = true;
         notes.scaledEnd = {begin, gain};
     }

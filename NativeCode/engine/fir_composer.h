@@ -39,9 +39,6 @@ struct CompositionInputs {
 
 class FirComposer {
 public:
-    /// Behind these frames nothing is written again that has not changed.
-    static constexpr int comparedFrames = 16384;
-
     /// Load time: allocates both responses.
     void prepare(int firBufferSize);
     /// Load time: allocates what spares filtering in later blocks.
@@ -87,12 +84,16 @@ private:
 
     void listPieces(CompositionInputs& inputs) noexcept;
     void composeChanges(CompositionInputs& inputs) noexcept;
-    void writeWhole(const EarBuffers& ears, CompositionInputs& inputs, int same) noexcept;
+    void writeWhole(const EarBuffers& ears,
+                    CompositionInputs& inputs,
+                    int piecesEnd,
+                    FrameRange changed) noexcept;
     void writeEnd(const EarBuffers& ears, CompositionInputs& inputs) noexcept;
     void writeStart(const EarBuffers& ears,
                     CompositionInputs& inputs,
                     int end,
-                    float gain) noexcept;
+                    float gain,
+                    FrameRange changed) noexcept;
 
     PieceList pieces_;         ///< of this composition
     PieceList lastPieces_;     ///< of the responses as they stand

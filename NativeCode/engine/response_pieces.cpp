@@ -54,6 +54,31 @@ bool PieceList::operator==(const PieceList& other) const noexcept {
     return count_ == other.count_ && std::equal(begin(), end(), other.begin());
 }
 
+FrameRange PieceList::differencesTo(const PieceList& other) const noexcept {
+    FrameRange range{0, 0};
+    const auto include = [&range](const ResponsePiece& piece) noexcept {
+        const int end = piece.position + piece.frames;
+        if (range.begin >= range.end) {
+            range = {piece.position, end};
+        } else {
+            range = {std::min(range.begin, piece.position), std::max(range.end, end)};
+        }
+    };
+    for (int k = 0; k < std::max(count_, other.count_); ++k) {
+        const auto at = static_cast<std::size_t>(k);
+        if (k < count_ && k < other.count_ && pieces_[at] == other.pieces_[at]) {
+            continue;
+        }
+        if (k < count_) {
+            include(pieces_[at]);
+        }
+        if (k < other.count_) {
+            include(other.pieces_[at]);
+        }
+    }
+    return range;
+}
+
 void PieceWriter::prepare(int hrirLength) {
     framesKept_ = std::max(hrirLength, 0);
     samples_ = AlignedArray<float>(std::size_t{2} * PieceList::capacity *

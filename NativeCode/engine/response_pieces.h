@@ -52,6 +52,8 @@ public:
     /// First frame behind all pieces, 0 without any.
     int extent() const noexcept;
     bool operator==(const PieceList& other) const noexcept;
+    /// Frames that any piece touches that the other list has not in the same place.
+    FrameRange differencesTo(const PieceList& other) const noexcept;
 
 private:
     std::array<ResponsePiece, capacity> pieces_{};

@@ -728,19 +728,33 @@ TESSALY_KERNEL_INLINE void sumProducts(std::size_t bins,
         }
         sumGroup<Lanes, Group, Start>(bins, x, l, r, sumL, sumR);
     };
-    std::size_t done = 0;
-    if (!onto && count >= group) {
-        take.template operator()<group, true>();
-        done = group;
-    } else if (!onto && count > 0) {
-        take.template operator()<1, true>();
-        done = 1;
+    const auto takeUpTo4 = [&]<bool Start>(std::size_t products) {
+        switch (products) {
+            case 1:
+                take.template operator()<1, Start>();
+                break;
+            case 2:
+                take.template operator()<2, Start>();
+                break;
+            case 3:
+                take.template operator()<3, Start>();
+                break;
+            default:
+                take.template operator()<group, Start>();
+                break;
+        }
+    };
+    std::size_t left = count;
+    if (!onto && left > 0) {
+        const std::size_t products = left < group ? left : group;
+        takeUpTo4.template operator()<true>(products);
+        left -= products;
     }
-    for (; done + group <= count; done += group) {
+    for (; left >= group; left -= group) {
         take.template operator()<group, false>();
     }
-    for (; done < count; ++done) {
-        take.template operator()<1, false>();
+    if (left > 0) {
+        takeUpTo4.template operator()<false>(left);
     }
 }
 
