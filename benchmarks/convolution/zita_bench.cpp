@@ -4,17 +4,41 @@
 // second form a thread for each larger partition size works beside the caller. A block here waits
 // for what they still owe, and the time is that of the processor for all threads of the program.
 #include <benchmark/benchmark.h>
+#include <unistd.h>
 #include <zita-convolver.h>
 
 #include <algorithm>
+#include <chrono>
 #include <cmath>
+#include <filesystem>
+#include <fstream>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include "convolution/convolver.h"
 
 namespace tessaly::bench {
 namespace {
+
+/// All threads of the program but this one are asleep.
+bool othersWait() {
+    const std::string self = std::to_string(gettid());
+    for (const auto& entry : std::filesystem::directory_iterator("/proc/self/task")) {
+        if (entry.path().filename() == self) {
+            continue;
+        }
+        std::ifstream file(entry.path() / "stat");
+        std::string number;
+        std::string name;
+        std::string state;
+        file >> number >> name >> state;
+        if (state == "R") {
+            return false;
+        }
+    }
+    return true;
+}
 
 class Peer {
 public:
@@ -34,9 +58,16 @@ public:
             good_ = good_ && process_.impdata_create(0, ear, 1, response.data(), 0, taps) == 0;
         }
         good_ = good_ && process_.start_process(0, SCHED_OTHER) == 0;
+        // Stopped before it has begun a thread would go on after its memory.
+        while (!othersWait()) {
+            std::this_thread::sleep_for(std::chrono::milliseconds(1));
+        }
     }
     ~Peer() {
         process_.stop_process();
+        while (process_.state() == Convproc::ST_WAIT && !process_.check_stop()) {
+            std::this_thread::sleep_for(std::chrono::milliseconds(1));
+        }
         process_.cleanup();
     }
     Peer(const Peer&) = delete;

@@ -15,7 +15,6 @@ namespace tessaly::bench {
 
 inline constexpr std::uint32_t sampleRate = 48000;
 inline constexpr std::uint32_t blockLengths[] = {256, 1024};
-inline constexpr int roomCount = 53;
 /// Room of the reflections and of the tail that most rows play: 8192 frames and 1.5 s.
 inline constexpr float hallSelection = 5.0f;
 
