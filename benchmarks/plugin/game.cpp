@@ -7,6 +7,7 @@
 #include <exception>
 #include <filesystem>
 #include <fstream>
+#include <map>
 #include <stdexcept>
 #include <string>
 
@@ -66,6 +67,22 @@ std::vector<Candidate> openCandidates() {
     return opened;
 }
 
+HostBuffers& hostBuffers(std::uint32_t frames) {
+    static std::map<std::uint32_t, HostBuffers> all;
+    HostBuffers& buffers = all[frames];
+    if (buffers.out.empty()) {
+        const std::size_t samples = 2 * static_cast<std::size_t>(frames);
+        buffers.silence.resize(samples);
+        buffers.out.resize(samples);
+        buffers.noise.resize(samples);
+        fillNoise(buffers.noise.data(), samples);
+        for (float& sample : buffers.noise) {
+            sample *= 0.25f;
+        }
+    }
+    return buffers;
+}
+
 }  // namespace
 
 const std::vector<Candidate>& candidates() {
@@ -94,8 +111,8 @@ Vector3 walk(int step, int source, int sources) {
 Played::Played(const PluginLibrary& library, const char* effect, std::uint32_t blockLength)
     : frames_(blockLength),
       effect_(library.effect(effect), sampleRate, blockLength),
-      in_(2 * static_cast<std::size_t>(blockLength)),
-      out_(in_.size()) {}
+      buffers_(hostBuffers(blockLength)),
+      in_(buffers_.silence.data()) {}
 
 void Played::place(const Vector3& position) {
     Pose source;
@@ -103,15 +120,10 @@ void Played::place(const Vector3& position) {
     effect_.place(Pose{}, source);
 }
 
-void Played::feed(bool noise) {
-    fillNoise(in_.data(), in_.size());
-    for (float& sample : in_) {
-        sample = noise ? 0.25f * sample : 0.0f;
-    }
-}
+void Played::feed(bool noise) { in_ = noise ? buffers_.noise.data() : buffers_.silence.data(); }
 
 void Played::block() {
-    if (effect_.processBlock(in_.data(), out_.data(), frames_) != 0) {
+    if (effect_.processBlock(in_, buffers_.out.data(), frames_) != 0) {
         throw std::runtime_error("a block failed");
     }
 }

@@ -38,7 +38,15 @@ void expectNoError(benchmark::State& state, const PluginLibrary& library);
 /// metres.
 Vector3 walk(int step, int source, int sources);
 
-/// One effect with its host buffers.
+/// Interleaved stereo blocks. A mixer hands the same few buffers to one effect after the other, so
+/// that they are in the cache: all effects share these.
+struct HostBuffers {
+    std::vector<float> noise;  ///< 0.25 peak
+    std::vector<float> silence;
+    std::vector<float> out;
+};
+
+/// One effect, fed with noise or silence; at first with silence.
 class Played {
 public:
     Played(const PluginLibrary& library, const char* effect, std::uint32_t blockLength);
@@ -48,7 +56,7 @@ public:
     /// Puts the source somewhere, seen from the listener, metres.
     void place(const Vector3& position);
 
-    /// Noise of 0.25 peak from now on, or silence.
+    /// Noise from now on, or silence.
     void feed(bool noise);
 
     /// One block. @throws std::runtime_error if the callback fails
@@ -57,8 +65,8 @@ public:
 private:
     std::uint32_t frames_;
     EffectInstance effect_;
-    std::vector<float> in_;
-    std::vector<float> out_;
+    HostBuffers& buffers_;
+    float* in_;
 };
 
 }  // namespace tessaly::bench
