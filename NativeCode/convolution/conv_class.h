@@ -194,7 +194,7 @@ private:
                                   ComplexBin* product,
                                   std::int32_t bins) noexcept;
     void borrowAndProcess(convClass& second) noexcept;
-    bool sharesWith(const convClass& second) const noexcept;
+    bool sharesWith(const convClass& second) noexcept;
     void findChangedPartitions() noexcept;
     void transformChanged() noexcept;
     void keepTimeParts(std::size_t partitions);
@@ -251,7 +251,7 @@ private:
     InputRing ring_;                    ///< of the ring that this instance owns
     bool resultSilent_ = false;
 
-    const convClass* partner_ = nullptr;  ///< the second instance, once a crossfade block met it
+    const convClass* partner_ = nullptr;  ///< the second instance that `processCrossfade` met
     std::unique_ptr<FarTail> far_;
     bool farHeard_ = false;
     /// Slots of a ring that hold something else than the input as it came: what they hold counts,

@@ -1,0 +1,330 @@
+// One block of partitioned convolution, plain or with a crossfade.
+#include <algorithm>
+
+#include "convolution/conv_class.h"
+#include "convolution/sample_scan.h"
+
+namespace tessaly {
+
+float* convClass::process() noexcept {
+    watchSelection();
+    // In a crossfade block the first instance works on the spectrum that the second one made.
+    const bool borrowed = secondOLSactive && isSecondInstance == 0;
+    if (!borrowed) {
+        takeInput(blockNumber());
+    }
+    if ((filterChangeAll || forceUpdateAll) && isSecondInstance == 0) {
+        updateFilter();
+    }
+    advanceFarTail();
+    const RingView ring = borrowed ? RingView{FDL, nullptr, newestSlot()} : ownRing();
+    render(ring, partner_ != nullptr ? partner_->ownRing() : ring);
+    return outputL;
+}
+
+/// The number of the block that is being made; 0 where nobody counts.
+std::uint64_t convClass::blockNumber() const noexcept {
+    return far_ != nullptr ? far_->block() + 1 : InputRing::noBlock;
+}
+
+/// A window of zeros has a spectrum of zeros.
+void convClass::takeInput(std::uint64_t block) noexcept {
+    const std::size_t slot = newestSlot();
+    ComplexBin* const spectrum = FDL[slot];
+    const bool silent = fftHandle != nullptr && input != nullptr && spectrum != nullptr &&
+                        allZero(input, static_cast<std::size_t>(fftLength));
+    if (silent) {
+        if (!ring_.silent(slot)) {
+            clearSpectrum(spectrum, binCount - 1);
+        }
+        dftiStatus = transformOk;
+    } else {
+        dftiStatus = FFT(input, spectrum, fftHandle);
+    }
+    ring_.set(slot, silent, dftiStatus == transformOk ? block : InputRing::noBlock);
+}
+
+convClass::RingView convClass::ownRing() const noexcept {
+    return {FDLown.empty() || isSecondInstance != 0 ? FDL : FDLown, &ring_, newestSlot()};
+}
+
+/// The engine writes the index; one outside of the ring is taken modulo N.
+std::size_t convClass::newestSlot() const noexcept {
+    const int slot = FDLpos % FDLtoBUFConv;
+    return static_cast<std::size_t>(slot < 0 ? slot + FDLtoBUFConv : slot);
+}
+
+/// A spectrum that memory failed for, or that was never lent, counts as zeros: the ear is silent.
+bool convClass::canSum(const RingView& ring, bool compensated) const noexcept {
+    const auto present = [](const std::vector<ComplexBin*>& spectra) {
+        return std::find(spectra.begin(), spectra.end(), nullptr) == spectra.end();
+    };
+    const bool response = compensated ? hpTFspectrumL != nullptr && hpTFspectrumR != nullptr
+                                      : present(filterPartsL) && present(filterPartsR);
+    return accumulators().complete() && end_.complete() && sums_.ready() && response &&
+           present(ring.spectra);
+}
+
+/// One block from a ring with the spectra as they stand.
+void convClass::render(const RingView& ring, const RingView& other) noexcept {
+    const bool compensated = hpTFactive && FDLtoBUFConv == 1;
+    farHeard_ = false;
+    if (ring.state != nullptr && ring.state->silent() && ifftHandle != nullptr) {
+        renderSilence();
+        return;
+    }
+    resultSilent_ = false;
+    const bool complete = canSum(ring, compensated);
+    clearSpectrum(accumL, binCount - 1);
+    clearSpectrum(accumR, binCount - 1);
+    if (complete && compensated) {
+        sums_.begin();
+        sums_.add(ring.spectra[0], hpTFspectrumL, hpTFspectrumR);
+        sums_.store(accumulators());
+    } else if (complete) {
+        farHeard_ = findFarCorrections(ring, other, scaled_, scaled_);
+        const Layout layout = layoutOf(scaled_);
+        const auto all = [](std::size_t) { return true; };
+        collect(ring, 0, layout.scaledBegin, all);
+        sums_.addTo(accumulators());
+        collect(ring, layout.scaledBegin, layout.end, all);
+        addFarHeld();
+        sums_.addTo(accumulators(), layout.gain);
+        subtractFarExpected(accumulators(), layout.gain);
+    }
+    transformBack();
+    if (farHeard_) {
+        far_->addTo(outputL + blockLength, outputR + blockLength, layoutOf(scaled_).gain,
+                    blockLength);
+    }
+}
+
+void convClass::transformBack() noexcept {
+    dftiStatus = IFFT(accumL, outputL, ifftHandle);
+    dftiStatus = IFFT(accumR, outputR, ifftHandle);
+}
+
+/// The results of a silent block are still there in the next one.
+void convClass::renderSilence() noexcept {
+    dftiStatus = transformOk;
+    for (float* const output : {outputL, outputR}) {
+        if (output != nullptr && !resultSilent_) {
+            std::fill_n(output, fftLength, 0.0f);
+        }
+    }
+    resultSilent_ = true;
+}
+
+/// What the uniform sums cover in this block, and from where on with a gain. Without a gain of
+/// its end a response whose far tail is heard ends its uniform part there as well.
+convClass::Layout convClass::layoutOf(const ScaledPartitions& scaled) const noexcept {
+    const std::size_t end = farHeard_ ? far_->firstPartition() : filterPartsL.size();
+    return scaled.begin < end
+               ? Layout{scaled.begin, end, scaled.gain}
+               : Layout{end, end, scaled.begin < filterPartsL.size() ? scaled.gain : 1.0f};
+}
+
+/// Pairs the chosen partitions in [begin, end) with their inputs. What is known to be zero is left
+/// out.
+template <typename Choice>
+void convClass::collect(const RingView& ring,
+                        std::size_t begin,
+                        std::size_t end,
+                        Choice&& chosen) noexcept {
+    const auto partitions = static_cast<std::size_t>(FDLtoBUFConv);
+    sums_.begin();
+    for (std::size_t i = begin; i < end; ++i) {
+        if (silent_[i] != 0 || !chosen(i)) {
+            continue;
+        }
+        // Partition i meets the input of i blocks ago.
+        const std::size_t slot = (ring.newest + partitions - i) % partitions;
+        if (ring.state == nullptr || !ring.state->silent(slot)) {
+            sums_.add(ring.spectra[slot], filterPartsL[i], filterPartsR[i]);
+        }
+    }
+}
+
+/// Whether the far tail can stand for its partitions in this block: its response is that of the
+/// spectra, it is behind all samples without the gain of the end, and where a ring holds something
+/// else than the input as it came, which crossfade blocks bring about, the difference is known and
+/// small.
+bool convClass::findFarCorrections(const RingView& ring,
+                                   const RingView& other,
+                                   const ScaledPartitions& before,
+                                   const ScaledPartitions& now) noexcept {
+    farHeld_.clear();
+    farExpected_.clear();
+    if (far_ == nullptr || !far_->ready() || ring.state == nullptr) {
+        return false;
+    }
+    const std::size_t partitions = filterPartsL.size();
+    const std::size_t first = far_->firstPartition();
+    for (const std::size_t begin : {before.begin, now.begin}) {
+        if (begin > first && begin < partitions) {
+            return false;
+        }
+    }
+    const std::uint64_t block = far_->block();
+    for (std::size_t i = first; i < partitions; ++i) {
+        const std::size_t slot = (ring.newest + partitions - i) % partitions;
+        const std::uint64_t expected = i < block ? block - i : InputRing::noBlock;
+        if (expected != InputRing::noBlock && ring.state->block(slot) == expected) {
+            continue;
+        }
+        if (silent_[i] != 0) {
+            continue;
+        }
+        if (!ring.state->silent(slot)) {
+            if (farHeld_.size() == farHeld_.capacity()) {
+                return false;
+            }
+            farHeld_.push_back({i, ring.spectra[slot]});
+        }
+        if (expected != InputRing::noBlock && !far_->silentBlock(expected)) {
+            if (other.state->block(slot) != expected ||
+                farExpected_.size() == farExpected_.capacity()) {
+                return false;
+            }
+            farExpected_.push_back({i, other.spectra[slot]});
+        }
+    }
+    return true;
+}
+
+void convClass::addFarHeld() noexcept {
+    if (farHeard_) {
+        for (const FarCorrection& held : farHeld_) {
+            sums_.add(held.spectrum, filterPartsL[held.partition], filterPartsR[held.partition]);
+        }
+    }
+}
+
+void convClass::subtractFarExpected(const EarSpectra& sum, float gain) noexcept {
+    if (farHeard_ && !farExpected_.empty()) {
+        sums_.begin();
+        for (const FarCorrection& expected : farExpected_) {
+            sums_.add(expected.spectrum, filterPartsL[expected.partition],
+                      filterPartsR[expected.partition]);
+        }
+        sums_.addTo(sum, -gain);
+    }
+}
+
+/// The plain order of a crossfade block, for all cases that the shared sum does not cover.
+void convClass::borrowAndProcess(convClass& second) noexcept {
+    second.scaled_ = scaled_;  // it renders with these spectra as they stand
+    second.process();
+    std::copy(second.FDL.begin(), second.FDL.end(), FDL.begin());
+    process();
+    std::copy(FDLown.begin(), FDLown.end(), FDL.begin());
+}
+
+/// Both have all their memory and read the same spectra; once found so, that stays.
+bool convClass::sharesWith(const convClass& second) noexcept {
+    if ((hpTFactive && FDLtoBUFConv == 1) || second.newestSlot() != newestSlot()) {
+        return false;
+    }
+    if (partner_ == &second) {
+        return true;
+    }
+    const bool shares = directFilterFeed == 0 && isSecondInstance == 0 &&
+                        second.isSecondInstance != 0 && second.FDLtoBUFConv == FDLtoBUFConv &&
+                        second.binCount == binCount && fftHandle != nullptr &&
+                        ifftHandle != nullptr && second.fftHandle != nullptr &&
+                        second.ifftHandle != nullptr && second.accumulators().complete() &&
+                        canSum(second.ownRing(), false) && second.filterPartsL == filterPartsL &&
+                        second.filterPartsR == filterPartsR;
+    partner_ = shares ? &second : nullptr;
+    return shares;
+}
+
+void convClass::processCrossfade(convClass& second, std::int32_t heardOfOld) noexcept {
+    if (!sharesWith(second)) {
+        borrowAndProcess(second);
+        return;
+    }
+    second.watchSelection();
+    second.takeInput(blockNumber());
+    watchSelection();
+    const bool update = filterChangeAll || forceUpdateAll;
+    if (update && hpTFactive) {
+        fullLengthBranch();
+    }
+    changedCount_ = 0;
+    const ScaledPartitions before = scaled_;
+    if (update) {
+        findChangedPartitions();
+        scaled_ = scaledNow();
+    }
+    advanceFarTail();
+    const RingView ring = second.ownRing();
+    const std::int32_t heard = std::clamp(heardOfOld, 0, blockLength);
+    if (changedCount_ > 0 && ring.state->silent()) {
+        transformChanged();
+        changedCount_ = 0;
+    }
+    if (ring.state->silent() || (changedCount_ == 0 && before == scaled_)) {
+        render(ring, ownRing());
+        std::copy_n(outputL + blockLength, heard, second.outputL + blockLength);
+        std::copy_n(outputR + blockLength, heard, second.outputR + blockLength);
+        return;
+    }
+    renderBoth(second, before, heard);
+}
+
+/// Old and new response share what no update touched, and the end of them without its gain.
+void convClass::renderBoth(convClass& second,
+                           const ScaledPartitions& before,
+                           std::int32_t heard) noexcept {
+    const RingView ring = second.ownRing();
+    resultSilent_ = false;
+    farHeard_ = findFarCorrections(ring, ownRing(), before, scaled_);
+    const Layout old = layoutOf(before);
+    const Layout now = layoutOf(scaled_);
+    const std::size_t lastBegin = std::max(old.scaledBegin, now.scaledBegin);
+    const auto untouched = [this](std::size_t i) { return changed_[i] == 0; };
+    const auto touched = [this](std::size_t i) { return changed_[i] != 0; };
+
+    collect(ring, 0, lastBegin, untouched);
+    if (!sums_.store(accumulators())) {
+        clearSpectrum(accumL, binCount - 1);
+        clearSpectrum(accumR, binCount - 1);
+    }
+    collect(ring, lastBegin, old.end, untouched);
+    addFarHeld();
+    bool hasEnd = sums_.store(end_);
+    if (farHeard_ && !farExpected_.empty()) {
+        if (!hasEnd) {
+            clearSpectrum(end_.left, binCount - 1);
+            clearSpectrum(end_.right, binCount - 1);
+        }
+        subtractFarExpected(end_, 1.0f);
+        hasEnd = true;
+    }
+    const auto bins = static_cast<std::size_t>(binCount);
+    std::copy_n(accumL, bins, second.accumL);
+    std::copy_n(accumR, bins, second.accumR);
+    const auto addOwn = [&](const Layout& layout, const EarSpectra& sum) {
+        collect(ring, 0, layout.scaledBegin, touched);
+        sums_.addTo(sum);
+        collect(ring, layout.scaledBegin, layout.end, touched);
+        sums_.addTo(sum, layout.gain);
+        if (hasEnd) {
+            sums_.addScaled(end_, layout.gain, sum);
+        }
+    };
+
+    addOwn(old, second.accumulators());
+    second.dftiStatus = middleIFFT(second.accumL, second.outputL, heard, second.ifftHandle);
+    second.dftiStatus = middleIFFT(second.accumR, second.outputR, heard, second.ifftHandle);
+    transformChanged();
+    addOwn(now, accumulators());
+    transformBack();
+    if (farHeard_) {
+        far_->addTo(second.outputL + blockLength, second.outputR + blockLength, old.gain, heard);
+        far_->addTo(outputL + blockLength, outputR + blockLength, now.gain, blockLength);
+    }
+}
+
+}  // namespace tessaly

@@ -1,0 +1,160 @@
+// What an update takes from the responses: the partitions that changed.
+#include <algorithm>
+#include <cstring>
+
+#include "base/log.h"
+#include "convolution/conv_class.h"
+#include "convolution/sample_scan.h"
+
+namespace tessaly {
+
+void convClass::updateFilter() noexcept {
+    if (directFilterFeed != 0) {
+        feedDirectly(firL, timePartsL, filterPartsL);
+        feedDirectly(firR, timePartsR, filterPartsR);
+    } else {
+        if (FDLtoBUFConv != 1 && hpTFactive) {
+            fullLengthBranch();
+        }
+        findChangedPartitions();
+        transformChanged();
+    }
+    if (hpTFactive && FDLtoBUFConv == 1) {
+        multiplyHeadphone(filterPartsL[0], hpTFspectrumL, binCount);
+        multiplyHeadphone(filterPartsR[0], hpTFspectrumR, binCount);
+    }
+}
+
+/// Whatever the FIR buffer holds in its first 2B samples, without padding. The other partitions
+/// keep the zeros they were made with, and so do their spectra.
+void convClass::feedDirectly(float* fir,
+                             std::vector<float*>& timeParts,
+                             const std::vector<ComplexBin*>& filterParts) noexcept {
+    if (firBufferSize < fftLength) {
+        return;
+    }
+    timeParts[0] = fir;
+    dftiStatus = FFT(fir, filterParts[0], fftHandle);
+}
+
+/// A partition whose samples are bit for bit those last transformed keeps its spectrum: a source
+/// that stands still asks for an update in every block.
+void convClass::findChangedPartitions() noexcept {
+    std::fill(changed_.begin(), changed_.end(), std::uint8_t{0});
+    changedCount_ = 0;
+    const auto length = static_cast<std::size_t>(blockLength);
+    std::size_t first = 0;
+    std::size_t end = changed_.size();
+    if (notes_ != nullptr) {
+        FirStretch& written = notes_->written;
+        if (written.empty()) {
+            return;
+        }
+        first = static_cast<std::size_t>(std::max(written.begin, 0)) / length;
+        end = std::min(end, (static_cast<std::size_t>(written.end) + length - 1) / length);
+        written.clear();
+    }
+    const ScaledPartitions next = scaledNow();
+    const auto available = static_cast<std::size_t>(std::max(firBufferSize, 0));
+    const auto differs = [length](const float* kept, const float* fir, std::size_t start) {
+        return fir != nullptr &&
+               (kept == nullptr || std::memcmp(kept, fir + start, length * sizeof(float)) != 0);
+    };
+    for (std::size_t i = first; i < end; ++i) {
+        const std::size_t start = i * length;
+        if (start + length > available) {
+            break;
+        }
+        // One that joins or leaves the scaled end counts differently even with equal samples.
+        if (differs(timePartsL[i], firL, start) || differs(timePartsR[i], firR, start) ||
+            fftHandle == nullptr || (i < scaled_.begin) != (i < next.begin)) {
+            changed_[i] = 1;
+            ++changedCount_;
+            if (far_ != nullptr && i >= far_->firstPartition()) {
+                far_->responseChanged();
+            }
+        }
+    }
+}
+
+void convClass::transformChanged() noexcept {
+    scaled_ = scaledNow();
+    const auto length = static_cast<std::size_t>(blockLength);
+    const auto take = [&](const float* fir, float* kept, ComplexBin* spectrum) noexcept {
+        if (fir == nullptr) {
+            return false;
+        }
+        if (kept != nullptr) {
+            std::memcpy(kept, fir, length * sizeof(float));
+        }
+        dftiStatus = halfFFT(fir, spectrum, fftHandle);
+        return allZero(fir, length);
+    };
+    for (std::size_t i = 0; i < changed_.size(); ++i) {
+        if (changed_[i] != 0) {
+            const std::size_t start = i * length;
+            const bool leftSilent =
+                take(firL != nullptr ? firL + start : nullptr, timePartsL[i], filterPartsL[i]);
+            const bool rightSilent =
+                take(firR != nullptr ? firR + start : nullptr, timePartsR[i], filterPartsR[i]);
+            silent_[i] = leftSilent && rightSilent && dftiStatus == transformOk ? 1 : 0;
+        }
+    }
+}
+
+/// The far tail is built from what the spectra were made of: a copy where there is one of all
+/// samples, the response itself where its writer tells of each change.
+void convClass::advanceFarTail() noexcept {
+    if (far_ == nullptr) {
+        return;
+    }
+    const bool copied = !timePartsL.empty() && timePartsL.back() != nullptr;
+    const float* const left = copied ? timeMemoryL_.data() : firL;
+    const float* const right = copied ? timeMemoryR_.data() : firR;
+    const auto near = static_cast<std::int32_t>(far_->firstPartition()) * blockLength;
+    if (!copied && notes_ != nullptr && !notes_->written.empty() && notes_->written.end > near) {
+        far_->responseChanged();  // written, but not taken yet
+    }
+    far_->advance(input, left, right);
+}
+
+/// Compensation of the whole response at once. Its handles are never created, so every transform
+/// is refused and reported, and the responses stay as they are.
+void convClass::fullLengthBranch() noexcept {
+    const std::int32_t bins = firLengthHalf + 1;
+    clearSpectrum(hpTFspectrumL, bins - 1);
+    clearSpectrum(hpTFspectrumR, bins - 1);
+    logTrace("Full HPTF-CONV");
+    dftiStatus = FFT(firL, hpTFspectrumL, fftHandleFull);
+    dftiStatus = FFT(firR, hpTFspectrumR, fftHandleFull);
+    multiplyHeadphone(hpTFspectrumL, hpTFspectrumL, bins);
+    multiplyHeadphone(hpTFspectrumR, hpTFspectrumR, bins);
+    dftiStatus = IFFT(hpTFspectrumL, firL, ifftHandleFull);
+    dftiStatus = IFFT(hpTFspectrumR, firR, ifftHandleFull);
+}
+
+/// Where the headphone spectrum ends early, or there is none, the product is zero.
+void convClass::multiplyHeadphone(const ComplexBin* filter,
+                                  ComplexBin* product,
+                                  std::int32_t bins) noexcept {
+    if (filter == nullptr || product == nullptr) {
+        return;
+    }
+    const std::int32_t present = std::min(bins, HpTF_FreqBins);
+    vcMul(present, filter, tessaly::HpTF_Freq, product);
+    if (present < bins) {
+        clearSpectrum(product + present, bins - present - 1);
+    }
+}
+
+convClass::ScaledPartitions convClass::scaledNow() const noexcept {
+    const std::size_t all = filterPartsL.size();
+    if (notes_ == nullptr || blockLength <= 0) {
+        return {all, 1.0f};
+    }
+    const ScaledEnd& end = notes_->scaledEnd;
+    const auto begin = static_cast<std::size_t>(std::max(end.begin, 0) / blockLength);
+    return {std::min(begin, all), end.gain};
+}
+
+}  // namespace tessaly
