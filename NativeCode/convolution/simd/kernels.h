@@ -5,6 +5,7 @@
 #include <cstdint>
 
 #include "convolution/complex_bin.h"
+#include "convolution/simd/signal_kernels.h"
 
 namespace tessaly {
 
@@ -82,6 +83,8 @@ struct Kernels {
                     bool onto,
                     ComplexBin* sumL,
                     ComplexBin* sumR);
+    /// Loops over samples.
+    const SignalKernels* signal;
 };
 
 /// One table a source; null where the source was built for another architecture.

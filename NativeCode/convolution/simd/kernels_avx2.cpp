@@ -5,6 +5,7 @@
 
 #include <immintrin.h>
 
+#include "convolution/simd/doubles_x86.h"
 #include "convolution/simd/lanes_scalar.h"
 #include "convolution/simd/lanes_x86.h"
 
@@ -74,7 +75,8 @@ constexpr Kernels table{.name = "avx2",
                         .multiply = multiplyBins<Lanes8>,
                         .add = addBins<Lanes8>,
                         .ringSum = sumRing<Lanes8>,
-                        .listSum = sumList<Lanes8>};
+                        .listSum = sumList<Lanes8>,
+                        .signal = &signalKernelsOf<Lanes8, Stereo2, AheadFour>};
 
 }  // namespace
 

@@ -5,6 +5,7 @@
 
 #include <immintrin.h>
 
+#include "convolution/simd/doubles_x86.h"
 #include "convolution/simd/lanes_scalar.h"
 #include "convolution/simd/lanes_x86.h"
 
@@ -89,7 +90,8 @@ constexpr Kernels table{.name = "avx512",
                         .multiply = multiplyBins<Lanes16>,
                         .add = addBins<Lanes16>,
                         .ringSum = sumRing<Lanes16>,
-                        .listSum = sumList<Lanes16>};
+                        .listSum = sumList<Lanes16>,
+                        .signal = &signalKernelsOf<Lanes16, Stereo4, AheadFour>};
 
 }  // namespace
 

@@ -7,6 +7,7 @@
 #include <arm_neon.h>
 #endif
 
+#include "convolution/simd/doubles_neon.h"
 #include "convolution/simd/lanes_neon.h"
 #include "convolution/simd/lanes_scalar.h"
 
@@ -61,7 +62,8 @@ constexpr Kernels table{.name = "neon",
                         .multiply = multiplyBins<LanesNeon>,
                         .add = addBins<LanesNeon>,
                         .ringSum = sumRing<LanesNeon>,
-                        .listSum = sumList<LanesNeon>};
+                        .listSum = sumList<LanesNeon>,
+                        .signal = &signalKernelsOf<LanesNeon, StereoNeon, AheadNeon>};
 
 }  // namespace
 

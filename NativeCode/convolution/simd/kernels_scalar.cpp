@@ -1,4 +1,5 @@
 // Plain kernels, for every CPU.
+#include "convolution/simd/doubles_scalar.h"
 #include "convolution/simd/kernels.h"
 #include "convolution/simd/lanes_scalar.h"
 
@@ -69,7 +70,8 @@ constexpr Kernels table{.name = "scalar",
                         .multiply = multiply,
                         .add = add,
                         .ringSum = ringSum,
-                        .listSum = listSum};
+                        .listSum = listSum,
+                        .signal = &signalKernelsOf<LanesScalar, StereoScalar, AheadScalar>};
 
 }  // namespace
 

@@ -5,6 +5,7 @@
 
 #include <emmintrin.h>
 
+#include "convolution/simd/doubles_x86.h"
 #include "convolution/simd/lanes_scalar.h"
 #include "convolution/simd/lanes_x86.h"
 
@@ -59,7 +60,8 @@ constexpr Kernels table{.name = "sse2",
                         .multiply = multiplyBins<Lanes4>,
                         .add = addBins<Lanes4>,
                         .ringSum = sumRing<Lanes4>,
-                        .listSum = sumList<Lanes4>};
+                        .listSum = sumList<Lanes4>,
+                        .signal = &signalKernelsOf<Lanes4, Stereo1, AheadTwo>};
 
 }  // namespace
 
