@@ -1,7 +1,8 @@
 // A game for benchmarks: the built library with its data, and effects that are fed blocks.
 #include "plugin/game.h"
 
-#include <algorithm>
+#include <time.h>
+
 #include <cstdio>
 #include <cstdlib>
 #include <exception>
@@ -101,6 +102,12 @@ void expectNoError(benchmark::State& state, const PluginLibrary& library) {
     if (library.getErrorState() != 1) {
         state.SkipWithError("the library reports a failure");
     }
+}
+
+double threadSeconds() {
+    timespec now{};
+    clock_gettime(CLOCK_THREAD_CPUTIME_ID, &now);
+    return static_cast<double>(now.tv_sec) + 1e-9 * static_cast<double>(now.tv_nsec);
 }
 
 Vector3 walk(int step, int source, int sources) {

@@ -33,6 +33,10 @@ const std::vector<Candidate>& candidates();
 /// Fails a benchmark after which the library reports an error.
 void expectNoError(benchmark::State& state, const PluginLibrary& library);
 
+/// Seconds of processor time that this thread has used: what other programs do meanwhile does not
+/// count, as it would not beside an audio thread of real-time priority.
+double threadSeconds();
+
 /// Where one of several sources that walk round the head is in this block: 7 degrees further than
 /// in the last one, which is fast (330 degrees a second at 1024), 1 to 3 m away. Left-handed,
 /// metres.

@@ -5,7 +5,6 @@
 // played for as long as its response, since pages that nobody touches cost nothing.
 #include <benchmark/benchmark.h>
 
-#include <chrono>
 #include <fstream>
 #include <map>
 #include <string>
@@ -78,10 +77,9 @@ void load(benchmark::State& state, const Candidate* candidate, int room) {
         source.block();
         source.block();
         source.effect().setParameter("Room Selection", static_cast<float>(room));
-        const auto start = std::chrono::steady_clock::now();
+        const double start = threadSeconds();
         source.block();
-        state.SetIterationTime(
-            std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count());
+        state.SetIterationTime(threadSeconds() - start);
     }
     const auto [entry, isNew] = memory.try_emplace({candidate->name, room});
     if (isNew) {

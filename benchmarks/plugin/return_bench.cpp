@@ -4,7 +4,6 @@
 // plays a hall with its 1.5 s, the sources have its reflections, walk and send to every return.
 #include <benchmark/benchmark.h>
 
-#include <chrono>
 #include <memory>
 #include <string>
 #include <vector>
@@ -82,10 +81,9 @@ void sharedReturn(benchmark::State& state,
             playReceivers();
             continue;
         }
-        const auto start = std::chrono::steady_clock::now();
+        const double start = threadSeconds();
         playReceivers();
-        state.SetIterationTime(
-            std::chrono::duration<double>(std::chrono::steady_clock::now() - start).count());
+        state.SetIterationTime(threadSeconds() - start);
     }
     expectNoError(state, candidate->library);
 }

@@ -71,13 +71,16 @@ def run_program(program, arguments):
         ]
         if arguments.cpu is not None and shutil.which("taskset"):
             command = ["taskset", "-c", str(arguments.cpu), *command]
-        result = run(
-            command, env=environment, stdout=subprocess.DEVNULL, stderr=subprocess.PIPE, text=True
-        )
+        # To a file: a pipe's reader would wake up in the middle of what is timed.
+        messages = Path(folder) / "messages.txt"
+        with messages.open("wb") as stream:
+            result = run(command, env=environment, stdout=subprocess.DEVNULL, stderr=stream)
+        said = messages.read_text(encoding="utf-8", errors="replace").splitlines()
         if result.returncode != 0:
-            fail(f"{program.name} ended with code {result.returncode}\n{result.stderr}")
+            last = "\n".join(said[-20:])
+            fail(f"{program.name} ended with code {result.returncode}\n{last}")
         # What the program itself says; the library writes there too.
-        for line in result.stderr.splitlines():
+        for line in said:
             if line.startswith(f"{program.name}: "):
                 print(line, file=sys.stderr)
         # With no benchmark left by the filter nothing is written.

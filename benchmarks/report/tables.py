@@ -14,7 +14,7 @@ GROUPS = {
     "Source": (
         "A block of one source, the whole Process call",
         ["room", "source", "sources", "block"],
-        ["openal", "against"],
+        ["against", "openal"],
     ),
     "Return": (
         "A block of all sources and their returns, or of the returns alone",
@@ -103,6 +103,9 @@ def make_table(group, rows):
         first = row.get(variants[0])
         line += extra(key, first, share) if first else [""] * len(extra_head)
         lines.append(line)
+    references = sorted({name for row in rows.values() if (name := reference_of(group, row))})
+    if references:
+        title += f" (speed, {' or else '.join(references)} = 1)"
     return Table(title, [*keys, *variants, *extra_head], lines, notes_of(group, rows))
 
 
