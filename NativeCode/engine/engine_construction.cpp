@@ -221,7 +221,10 @@ void allocateBuffers(EngineState& state) {
     state.output.prepare(state.sizes.blocklenght, state.switches.fading);
     state.frontEnd.prepareWindow(state.sizes.blocklenght);
     state.composer.prepare(state.sizes.firBufferSize);
-    state.composer.prepareKeptParts(state.switches.hrirLength, state.tail);
+    const bool filtersReflections =
+        state.switches.qvFlexReflections && state.reflections.presetUsesFilters;
+    state.composer.prepareKeptParts(
+        filtersReflections ? state.switches.hrirLength : std::int16_t{0}, state.tail);
     if (state.switches.qvInterpolateFilters) {
         state.interpolation.prepare(state.sizes.firBufferSize);
     }
