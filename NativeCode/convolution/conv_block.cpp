@@ -3,6 +3,7 @@
 
 #include "convolution/conv_class.h"
 #include "convolution/sample_scan.h"
+#include "convolution/simd/kernels.h"
 
 namespace tessaly {
 
@@ -252,6 +253,7 @@ void convClass::processCrossfade(convClass& second, std::int32_t heardOfOld) noe
         fullLengthBranch();
     }
     changedCount_ = 0;
+    changedTaps_ = 0;
     const ScaledPartitions before = scaled_;
     if (update) {
         findChangedPartitions();
@@ -264,13 +266,29 @@ void convClass::processCrossfade(convClass& second, std::int32_t heardOfOld) noe
         transformChanged();
         changedCount_ = 0;
     }
+    const bool byTaps = changedTaps_ > 0 && before == scaled_ && scaled_.begin > 0;
+    if (changedCount_ > 0 && byTaps) {
+        transformChanged();
+        changedCount_ = 0;
+    }
     if (ring.state->silent() || (changedCount_ == 0 && before == scaled_)) {
         render(ring, ownRing());
         std::copy_n(outputL + blockLength, heard, second.outputL + blockLength);
         std::copy_n(outputR + blockLength, heard, second.outputR + blockLength);
+        if (byTaps && !ring.state->silent()) {
+            renderOldByTaps(second, heard);
+        }
         return;
     }
     renderBoth(second, before, heard);
+}
+
+/// What a change of few taps of the start takes away, in the time domain: the old response's
+/// samples from the new one's. The first partition always meets the window of this very block.
+void convClass::renderOldByTaps(convClass& second, std::int32_t heard) noexcept {
+    kernels_->addTaps(static_cast<std::size_t>(heard), static_cast<std::size_t>(changedTaps_),
+                      startChange_.data(), startChange_.data() + directTaps, input + blockLength,
+                      second.outputL + blockLength, second.outputR + blockLength);
 }
 
 /// Old and new response share what no update touched, and the end of them without its gain.

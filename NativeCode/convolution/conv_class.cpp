@@ -209,6 +209,8 @@ void convClass::watch(FirNotes* notes, std::int32_t compared) {
     if (notes != nullptr && blockLength > 0 && isSecondInstance == 0) {
         const std::int32_t partitions = (std::max(compared, 0) + blockLength - 1) / blockLength;
         keepTimeParts(std::min(static_cast<std::size_t>(partitions), timePartsL.size()));
+        startTaps_ = AlignedArray<float>(2 * directTaps);
+        startChange_ = AlignedArray<float>(2 * directTaps);
     }
 }
 

@@ -117,6 +117,13 @@ public:
     /// The last block's result is zeros for certain.
     bool resultSilent() const noexcept { return resultSilent_; }
 
+    /// Takes what was written into the responses although no block asked for an update: the old
+    /// response of the next crossfade. Block time.
+    void takeResponses() noexcept;
+    /// The ring that the next block of this instance reads holds no sound but, it may be, that of
+    /// the block itself.
+    bool pastSilent() const noexcept { return ring_.silent(); }
+
     /// Zeroes every spectrum in `FDL`. Block time.
     void clearFDL() noexcept;
 
@@ -221,6 +228,8 @@ private:
     bool canSum(const RingView& ring, bool compensated) const noexcept;
     void render(const RingView& ring, const RingView& other) noexcept;
     void renderSilence() noexcept;
+    void renderOldByTaps(convClass& second, std::int32_t heard) noexcept;
+    void noteStartChange(std::int32_t taps) noexcept;
     void renderBoth(convClass& second, const ScaledPartitions& before, std::int32_t heard) noexcept;
     void transformBack() noexcept;
     /// Partitions [0, scaledBegin) of the uniform sums and [scaledBegin, end), which count `gain`
@@ -265,6 +274,13 @@ private:
 
     PartitionSums sums_;
     EarSpectra end_;  ///< sum over the scaled end, without its gain
+
+    /// Per ear the first samples of the response as last transformed, and what they were more than
+    /// what they are. A change of these alone is heard in the old block without a transform.
+    static constexpr std::int32_t directTaps = 256;
+    AlignedArray<float> startTaps_;
+    AlignedArray<float> startChange_;
+    std::int32_t changedTaps_ = 0;  ///< of the start, where nothing behind them changed; else 0
 
     /// One block of memory for each array above; the stride between two spectra is whole cache
     /// lines and no multiple of 4 KB, so that neighbours do not share cache sets.

@@ -9,13 +9,17 @@
 namespace tessaly {
 
 void convClass::updateFilter() noexcept {
+    if (directFilterFeed == 0 && FDLtoBUFConv != 1 && hpTFactive) {
+        fullLengthBranch();
+    }
+    takeResponses();
+}
+
+void convClass::takeResponses() noexcept {
     if (directFilterFeed != 0) {
         feedDirectly(firL, timePartsL, filterPartsL);
         feedDirectly(firR, timePartsR, filterPartsR);
     } else {
-        if (FDLtoBUFConv != 1 && hpTFactive) {
-            fullLengthBranch();
-        }
         findChangedPartitions();
         transformChanged();
     }
@@ -42,6 +46,7 @@ void convClass::feedDirectly(float* fir,
 void convClass::findChangedPartitions() noexcept {
     std::fill(changed_.begin(), changed_.end(), std::uint8_t{0});
     changedCount_ = 0;
+    changedTaps_ = 0;
     const auto length = static_cast<std::size_t>(blockLength);
     std::size_t first = 0;
     std::size_t end = changed_.size();
@@ -52,6 +57,7 @@ void convClass::findChangedPartitions() noexcept {
         }
         first = static_cast<std::size_t>(std::max(written.begin, 0)) / length;
         end = std::min(end, (static_cast<std::size_t>(written.end) + length - 1) / length);
+        noteStartChange(written.end);
         written.clear();
     }
     const ScaledPartitions next = scaledNow();
@@ -77,8 +83,29 @@ void convClass::findChangedPartitions() noexcept {
     }
 }
 
+/// @param taps  all that changed lies before
+void convClass::noteStartChange(std::int32_t taps) noexcept {
+    if (startTaps_.empty() || firL == nullptr || firR == nullptr ||
+        taps > std::min(directTaps, blockLength) || taps > firBufferSize) {
+        return;
+    }
+    changedTaps_ = taps;
+    float* const kept = startTaps_.data();
+    float* const change = startChange_.data();
+    const auto factor = static_cast<float>(fftLength);  // of the unscaled transforms
+    for (std::int32_t k = 0; k < taps; ++k) {
+        change[k] = factor * (kept[k] - firL[k]);
+        change[directTaps + k] = factor * (kept[directTaps + k] - firR[k]);
+    }
+}
+
 void convClass::transformChanged() noexcept {
     scaled_ = scaledNow();
+    if (!startTaps_.empty() && changed_[0] != 0 && firL != nullptr && firR != nullptr) {
+        const std::int32_t taps = std::min({directTaps, blockLength, firBufferSize});
+        std::copy_n(firL, taps, startTaps_.data());
+        std::copy_n(firR, taps, startTaps_.data() + directTaps);
+    }
     const auto length = static_cast<std::size_t>(blockLength);
     const auto take = [&](const float* fir, float* kept, ComplexBin* spectrum) noexcept {
         if (fir == nullptr) {

@@ -24,6 +24,11 @@ constexpr int tailFadeFrames = 15;
 constexpr float widestHeldStep = 5.0f;      // degrees; a wider move composes the old pair anew
 constexpr int filteredStartFrames = 16384;  // behind a longer early part the tail is filtered anew
 
+/// Equal means equal, also of what is no number.
+bool sameBits(float a, float b) noexcept {
+    return std::bit_cast<std::uint32_t>(a) == std::bit_cast<std::uint32_t>(b);
+}
+
 /// Frames of a stored pair that may be read.
 int readableFrames(int frames) noexcept { return std::clamp(frames, 0, hrirMaxLength); }
 
@@ -90,23 +95,33 @@ bool hasTail(const CompositionInputs& inputs) noexcept {
     return inputs.switches.qvReverb > 0 && inputs.sizes.FIR_size >= shortestResponseWithTail;
 }
 
-float tailGain(const CompositionInputs& inputs, float reverbMixGain) noexcept {
-    return inputs.tail.reverbPresetGain * reverbMixGain * inputs.law.reverbDistanceGain;
+bool hasMeasuredTail(const CompositionInputs& inputs) noexcept {
+    return hasTail(inputs) && inputs.switches.qvReverb != syntheticTail;
 }
 
-void addTails(const EarBuffers& ears, CompositionInputs& inputs, float reverbMixGain) noexcept {
+float tailGain(const CompositionInputs& inputs, float reverbMixGain) noexcept {
+    return hasMeasuredTail(inputs)
+               ? inputs.tail.reverbPresetGain * reverbMixGain * inputs.law.reverbDistanceGain
+               : reverbMixGain;
+}
+
+/// @param gain  of a measured tail as it counts, of the synthetic one the mix's share
+void addTails(const EarBuffers& ears,
+              CompositionInputs& inputs,
+              float cutOff,
+              float roomSizeFactor,
+              float gain) noexcept {
     if (!hasTail(inputs)) {
         return;
     }
     ReverbTail& tail = inputs.tail;
     if (inputs.switches.qvReverb == syntheticTail) {
         tail.addSyntheticTail(ears.left, ears.right, ears.size, inputs.switches.hrirLength,
-                              inputs.switches.limitTheta, reverbMixGain);
+                              inputs.switches.limitTheta, gain);
         return;
     }
-    tail.addTail(ears.left, ears.right, ears.size, inputs.controls.reverbLP_Fc, inputs.sampleRate,
-                 tailGain(inputs, reverbMixGain));
-    tail.cutToRoomSize(ears.left, ears.right, ears.size, inputs.controls.roomSizeFactor);
+    tail.addTail(ears.left, ears.right, ears.size, cutOff, inputs.sampleRate, gain);
+    tail.cutToRoomSize(ears.left, ears.right, ears.size, roomSizeFactor);
 }
 
 void clearFrames(const EarBuffers& ears, int frames) noexcept {
@@ -134,17 +149,18 @@ void FirComposer::forget() noexcept {
     const int size = static_cast<int>(filterLeftBuffer.size());
     startKnown_ = false;
     endKnown_ = false;
+    postponed_ = false;
     notes.written.include(0, size);
     notes.scaledEnd = {size, 1.0f};
 }
 
-void FirComposer::listPieces(CompositionInputs& inputs) noexcept {
+void FirComposer::listIngredients(const CompositionInputs& inputs) noexcept {
     const auto add = [this](const ResponsePiece& piece) noexcept {
         if (piece.hrir != nullptr) {
-            pieces_.add(piece);
+            wanted_.pieces.add(piece);
         }
     };
-    pieces_.clear();
+    wanted_.pieces.clear();
     add(directPiece(inputs));
     const EffectiveSettings& switches = inputs.switches;
     const Reflections& reflections = inputs.reflections;
@@ -171,17 +187,21 @@ void FirComposer::listPieces(CompositionInputs& inputs) noexcept {
     if (switches.qvReverb > 0) {
         reverbMixGain = inputs.mix.reverbGain;
     }
+    wanted_.tailGain = tailGain(inputs, reverbMixGain);
+    wanted_.tailCutOff = inputs.controls.reverbLP_Fc;
+    wanted_.roomSizeFactor = inputs.controls.roomSizeFactor;
 }
 
 void FirComposer::composeFIR(float* left, float* right, CompositionInputs& inputs) noexcept {
     const EarBuffers ears{left, right, inputs.sizes.firBufferSize};
     clearFrames(ears, ears.size);
-    listPieces(inputs);
-    plainWriter_.write(ears, pieces_, inputs.sampleRate, inputs.reflections.reflectionFilter);
+    listIngredients(inputs);
+    plainWriter_.write(ears, wanted_.pieces, inputs.sampleRate,
+                       inputs.reflections.reflectionFilter);
     if (inputs.forceUpdate) {
         inputs.frontEnd.followDistance(inputs.law.distance);
     }
-    addTails(ears, inputs, reverbMixGain);
+    addTails(ears, inputs, wanted_.tailCutOff, wanted_.roomSizeFactor, wanted_.tailGain);
 }
 
 /// @param piecesEnd  pieces end before, in this response and in the one that stands there
@@ -192,8 +212,8 @@ void FirComposer::writeWhole(const EarBuffers& ears,
                              FrameRange changed) noexcept {
     // Without a tail there are zeros behind the pieces.
     clearFrames(ears, hasTail(inputs) ? ears.size : piecesEnd);
-    writer_.write(ears, pieces_, inputs.sampleRate, inputs.reflections.reflectionFilter);
-    addTails(ears, inputs, reverbMixGain);
+    writer_.write(ears, wanted_.pieces, inputs.sampleRate, inputs.reflections.reflectionFilter);
+    addTails(ears, inputs, wanted_.tailCutOff, wanted_.roomSizeFactor, wanted_.tailGain);
     fadeFilterTail(inputs.sizes.FIR_size);
     notes.written.include(changed.begin, changed.end);
     notes.scaledEnd = {ears.size, 1.0f};
@@ -201,12 +221,9 @@ void FirComposer::writeWhole(const EarBuffers& ears,
 
 /// The tail without its gain, over all of the response.
 void FirComposer::writeEnd(const EarBuffers& ears, CompositionInputs& inputs) noexcept {
-    const LiveControls& controls = inputs.controls;
     clearFrames(ears, ears.size);
-    inputs.tail.refreshStart(controls.reverbLP_Fc, inputs.sampleRate);
-    inputs.tail.addTail(ears.left, ears.right, ears.size, controls.reverbLP_Fc, inputs.sampleRate,
-                        1.0f);
-    inputs.tail.cutToRoomSize(ears.left, ears.right, ears.size, controls.roomSizeFactor);
+    inputs.tail.refreshStart(wanted_.tailCutOff, inputs.sampleRate);
+    addTails(ears, inputs, wanted_.tailCutOff, wanted_.roomSizeFactor, 1.0f);
     fadeFilterTail(inputs.sizes.FIR_size);
     notes.written.include(0, ears.size);
 }
@@ -215,62 +232,77 @@ void FirComposer::writeEnd(const EarBuffers& ears, CompositionInputs& inputs) no
 void FirComposer::writeStart(const EarBuffers& ears,
                              CompositionInputs& inputs,
                              int end,
-                             float gain,
                              FrameRange changed) noexcept {
-    const LiveControls& controls = inputs.controls;
     clearFrames(ears, end);
-    writer_.write(ears, pieces_, inputs.sampleRate, inputs.reflections.reflectionFilter);
-    inputs.tail.addStart(ears.left, ears.right, end, controls.reverbLP_Fc, gain);
-    inputs.tail.cutToRoomSize(ears.left, ears.right, end, controls.roomSizeFactor);
+    writer_.write(ears, wanted_.pieces, inputs.sampleRate, inputs.reflections.reflectionFilter);
+    inputs.tail.addStart(ears.left, ears.right, end, wanted_.tailCutOff, wanted_.tailGain);
+    inputs.tail.cutToRoomSize(ears.left, ears.right, end, wanted_.roomSizeFactor);
     fadeFilterTail(inputs.sizes.FIR_size, end);
     notes.written.include(changed.begin, changed.end);
 }
 
-/// The engine's own responses: what composeFIR and fadeFilterTail give, of which only that is made
-/// again which may differ. A measured tail stands without its gain behind the early part, where a
-/// change of its level costs nothing.
+/// The engine's own responses: what composeFIR and fadeFilterTail give. While nobody hears them
+/// it is noted what they would be, and they are left as they are.
 void FirComposer::composeChanges(CompositionInputs& inputs) noexcept {
-    const EarBuffers ears{filterLeft, filterRight, inputs.sizes.firBufferSize};
-    listPieces(inputs);
+    listIngredients(inputs);
     if (inputs.forceUpdate) {
         inputs.frontEnd.followDistance(inputs.law.distance);
     }
+    const bool synthetic = hasTail(inputs) && !hasMeasuredTail(inputs);
+    if (inputs.unheard && !inputs.switches.qvInterpolateFilters && !synthetic) {
+        postponed_ = true;
+        return;
+    }
+    postponed_ = false;
+    writeChanges(inputs);
+}
+
+bool FirComposer::catchUp(CompositionInputs& inputs) noexcept {
+    if (!postponed_) {
+        return false;
+    }
+    postponed_ = false;
+    writeChanges(inputs);
+    return true;
+}
+
+/// Only that is made again which may differ from what stands there. A measured tail stands without
+/// its gain behind the early part, where a change of its level costs nothing.
+void FirComposer::writeChanges(CompositionInputs& inputs) noexcept {
+    const EarBuffers ears{filterLeft, filterRight, inputs.sizes.firBufferSize};
     if (lastTables_ != hrirTablesVersion) {
         lastTables_ = hrirTablesVersion;
         writer_.forget();
         startKnown_ = false;
     }
-    const bool samePieces = startKnown_ && pieces_ == lastPieces_;
+    const PieceList& pieces = wanted_.pieces;
+    const bool samePieces = startKnown_ && pieces == standing_.pieces;
     const FrameRange everything{0, ears.size};
-    const int lastEnd = std::max(pieces_.extent(), lastPieces_.extent());
+    const int extent = pieces.extent();
+    const int lastEnd = std::max(extent, standing_.pieces.extent());
     const int piecesEnd = startKnown_ && !endKnown_ ? std::clamp(lastEnd, 0, ears.size) : ears.size;
-    const FrameRange differences = pieces_.differencesTo(lastPieces_);
+    const FrameRange differences = pieces.differencesTo(standing_.pieces);
     const FrameRange changedPieces{std::clamp(differences.begin, 0, ears.size),
                                    std::clamp(differences.end, 0, ears.size)};
-    lastPieces_ = pieces_;
-
-    const bool measuredTail = hasTail(inputs) && inputs.switches.qvReverb != syntheticTail;
-    const float gain = measuredTail ? tailGain(inputs, reverbMixGain) : reverbMixGain;
-    const float cutOff = inputs.controls.reverbLP_Fc;
-    const TailIngredients tail{std::bit_cast<std::uint32_t>(cutOff),
-                               std::bit_cast<std::uint32_t>(inputs.controls.roomSizeFactor)};
-    const bool sameTail = tail == lastTail_;
-    const bool sameGain = std::bit_cast<std::uint32_t>(gain) == lastGain_;
-    lastTail_ = tail;
-    lastGain_ = std::bit_cast<std::uint32_t>(gain);
+    const bool sameTail = sameBits(wanted_.tailCutOff, standing_.tailCutOff) &&
+                          sameBits(wanted_.roomSizeFactor, standing_.roomSizeFactor);
+    const bool sameGain = sameBits(wanted_.tailGain, standing_.tailGain);
+    standing_ = wanted_;
 
     const int partition = std::max(inputs.sizes.blocklenght, 1);
     int begin = notes.scaledEnd.begin;
-    if (!endKnown_ || begin < pieces_.extent()) {
+    if (!endKnown_ || begin < extent) {
         // Two partitions are read as they stand by a convolver that is fed directly. Never back:
         // reflections that follow a source come and go.
-        begin = std::max(2, (pieces_.extent() + partition - 1) / partition + 1) * partition;
+        begin = std::max(2, (extent + partition - 1) / partition + 1) * partition;
     }
     // What is blended afterwards has to stand as it counts. The synthetic tail looks its directions
     // up anew each time.
     const bool blended = inputs.switches.qvInterpolateFilters;
+    const bool measuredTail = hasMeasuredTail(inputs);
     const bool synthetic = hasTail(inputs) && !measuredTail;
-    if (!measuredTail || blended || begin >= ears.size || begin > inputs.tail.startFrames(cutOff)) {
+    if (!measuredTail || blended || begin >= ears.size ||
+        begin > inputs.tail.startFrames(wanted_.tailCutOff)) {
         const bool sameEnd = !hasTail(inputs) || (sameTail && sameGain && !synthetic);
         if (endKnown_ || !samePieces || !sameEnd) {
             writeWhole(ears, inputs, piecesEnd,
@@ -288,9 +320,9 @@ void FirComposer::composeChanges(CompositionInputs& inputs) noexcept {
     if (!sameEnd || !samePieces || !sameGain || begin != notes.scaledEnd.begin) {
         const bool sameFrames =
             sameEnd && sameGain && startKnown_ && begin == notes.scaledEnd.begin;
-        writeStart(ears, inputs, begin, gain, sameFrames ? changedPieces : FrameRange{0, begin});
+        writeStart(ears, inputs, begin, sameFrames ? changedPieces : FrameRange{0, begin});
         startKnown_ = true;
-        notes.scaledEnd = {begin, gain};
+        notes.scaledEnd = {begin, wanted_.tailGain};
     }
 }
 

@@ -35,6 +35,7 @@ struct CompositionInputs {
     InputFrontEnd& frontEnd;  ///< its two distance filters are redesigned
     Reflections& reflections;
     ReverbTail& tail;
+    bool unheard = false;  ///< this block is silent whatever the responses are
 };
 
 class FirComposer {
@@ -58,6 +59,10 @@ public:
     /// Decides what is composed and blended in this block. Block time.
     void refreshFilter(CompositionInputs& inputs,
                        FirInterpolation& interpolation) noexcept TESSALY_NONBLOCKING;
+    /// Writes what was composed last while nobody heard it. Before the first block that is heard
+    /// again, and before the responses are read by others. Block time.
+    /// @return whether there was anything
+    bool catchUp(CompositionInputs& inputs) noexcept TESSALY_NONBLOCKING;
     /// The responses were written by somebody else: the next composition starts from nothing.
     /// Block time.
     void forget() noexcept;
@@ -73,17 +78,17 @@ public:
     float reverbMixGain = 0.0f;  ///< of the last composition
 
 private:
-    /// What decides the samples of the tail but its gain. Floats as their bits, so that equal means
-    /// equal.
-    struct TailIngredients {
-        std::uint32_t cutOff = 0;
-        std::uint32_t roomSizeFactor = 0;
-
-        bool operator==(const TailIngredients&) const = default;
+    /// All that decides the samples of a response.
+    struct Ingredients {
+        PieceList pieces;
+        float tailGain = 0.0f;    ///< linear; of the synthetic tail the mix's share of it
+        float tailCutOff = 0.0f;  ///< Hz
+        float roomSizeFactor = 0.0f;
     };
 
-    void listPieces(CompositionInputs& inputs) noexcept;
+    void listIngredients(const CompositionInputs& inputs) noexcept;
     void composeChanges(CompositionInputs& inputs) noexcept;
+    void writeChanges(CompositionInputs& inputs) noexcept;
     void writeWhole(const EarBuffers& ears,
                     CompositionInputs& inputs,
                     int piecesEnd,
@@ -92,18 +97,16 @@ private:
     void writeStart(const EarBuffers& ears,
                     CompositionInputs& inputs,
                     int end,
-                    float gain,
                     FrameRange changed) noexcept;
 
-    PieceList pieces_;         ///< of this composition
-    PieceList lastPieces_;     ///< of the responses as they stand
-    PieceWriter writer_;       ///< for the engine's responses
-    PieceWriter plainWriter_;  ///< keeps nothing
-    TailIngredients lastTail_;
-    std::uint32_t lastGain_ = 0;    ///< of the tail
+    Ingredients wanted_;            ///< of the newest composition
+    Ingredients standing_;          ///< of the responses as they stand
+    PieceWriter writer_;            ///< for the engine's responses
+    PieceWriter plainWriter_;       ///< keeps nothing
     std::uint32_t lastTables_ = 0;  ///< version of the HRIR tables
     bool startKnown_ = false;       ///< up to the scaled end: what the last ingredients make
     bool endKnown_ = false;         ///< from there on
+    bool postponed_ = false;        ///< the responses are behind `wanted_`
 };
 
 }  // namespace tessaly

@@ -2,6 +2,7 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cmath>
 #include <cstring>
 
@@ -178,6 +179,39 @@ TEST_P(KernelTable, ListSumEqualsPlainPassesAndAddsOntoASum) {
     }
 }
 
+TEST_P(KernelTable, AddTapsEqualsTheSumWrittenOut) {
+    for (const std::size_t samples : {0u, 1u, 3u, 4u, 7u, 8u, 16u, 31u, 64u, 65u, 130u}) {
+        for (const std::size_t taps : {0u, 1u, 2u, 7u, 128u}) {
+            Noise noise(static_cast<std::uint32_t>(samples * 200 + taps));
+            const std::vector<float> left = noise.samples(taps);
+            const std::vector<float> right = noise.samples(taps);
+            const std::size_t past = std::max<std::size_t>(taps, 1) - 1;
+            const std::vector<float> input = noise.samples(past + samples);
+            const std::vector<float> start = noise.samples(samples);
+            std::vector<float> sumL = start;
+            std::vector<float> sumR = start;
+            sumL.push_back(99.0f);
+            sumR.push_back(99.0f);
+            GetParam()->addTaps(samples, taps, left.data(), right.data(), input.data() + past,
+                                sumL.data(), sumR.data());
+            const double bound = 2.0 * static_cast<double>((taps + 1) * (taps + 1)) * 0x1p-24;
+            for (std::size_t n = 0; n < samples; ++n) {
+                double expectedL = static_cast<double>(start[n]);
+                double expectedR = expectedL;
+                for (std::size_t k = 0; k < taps; ++k) {
+                    const double x = static_cast<double>(input[past + n - k]);
+                    expectedL += static_cast<double>(left[k]) * x;
+                    expectedR += static_cast<double>(right[k]) * x;
+                }
+                ASSERT_NEAR(static_cast<double>(sumL[n]), expectedL, bound) << taps;
+                ASSERT_NEAR(static_cast<double>(sumR[n]), expectedR, bound) << taps;
+            }
+            EXPECT_EQ(sumL.back(), 99.0f);
+            EXPECT_EQ(sumR.back(), 99.0f);
+        }
+    }
+}
+
 INSTANTIATE_TEST_SUITE_P(Tables, KernelTable, testing::ValuesIn(testableKernels()), kernelTestName);
 
 TEST(KernelDispatch, OffersThePlainTableFirstAndTakesTheLast) {
@@ -209,6 +243,7 @@ TEST(KernelDispatch, EveryTableIsComplete) {
         EXPECT_NE(kernels->add, nullptr);
         EXPECT_NE(kernels->ringSum, nullptr);
         EXPECT_NE(kernels->listSum, nullptr);
+        EXPECT_NE(kernels->addTaps, nullptr);
         for (std::int32_t points = 2; points <= 32768; points *= 2) {
             const std::int32_t lanes = kernels->transformLanes(points);
             EXPECT_LE(lanes * lanes, points) << kernels->name;

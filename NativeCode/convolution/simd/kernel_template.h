@@ -798,5 +798,64 @@ void sumList(std::size_t bins,
     sumProducts<Lanes>(bins, count, onto, next, sumL, sumR);
 }
 
+// ---- Few taps in the time domain ----
+
+/// `Vectors` vectors of outputs of both ears at once.
+template <class Lanes, int Vectors>
+TESSALY_KERNEL_INLINE void addTapsAt(std::size_t taps,
+                                     const float* left,
+                                     const float* right,
+                                     const float* input,
+                                     float* sumL,
+                                     float* sumR) {
+    typename Lanes::Vector l[Vectors];
+    typename Lanes::Vector r[Vectors];
+    TESSALY_KERNEL_UNROLL
+    for (int v = 0; v < Vectors; ++v) {
+        l[v] = Lanes::load(sumL + v * Lanes::count);
+        r[v] = Lanes::load(sumR + v * Lanes::count);
+    }
+    for (std::size_t k = 0; k < taps; ++k) {
+        const auto tapL = Lanes::broadcast(left[k]);
+        const auto tapR = Lanes::broadcast(right[k]);
+        TESSALY_KERNEL_UNROLL
+        for (int v = 0; v < Vectors; ++v) {
+            const auto x = Lanes::load(input - k + v * Lanes::count);
+            l[v] = Lanes::multiplyAdd(tapL, x, l[v]);
+            r[v] = Lanes::multiplyAdd(tapR, x, r[v]);
+        }
+    }
+    TESSALY_KERNEL_UNROLL
+    for (int v = 0; v < Vectors; ++v) {
+        Lanes::store(sumL + v * Lanes::count, l[v]);
+        Lanes::store(sumR + v * Lanes::count, r[v]);
+    }
+}
+
+template <class Lanes>
+void addTaps(std::size_t samples,
+             std::size_t taps,
+             const float* left,
+             const float* right,
+             const float* input,
+             float* sumL,
+             float* sumR) {
+    constexpr std::size_t lanes = Lanes::count;
+    constexpr int vectors = 4;
+    std::size_t n = 0;
+    for (; n + vectors * lanes <= samples; n += vectors * lanes) {
+        addTapsAt<Lanes, vectors>(taps, left, right, input + n, sumL + n, sumR + n);
+    }
+    for (; n + lanes <= samples; n += lanes) {
+        addTapsAt<Lanes, 1>(taps, left, right, input + n, sumL + n, sumR + n);
+    }
+    for (; n < samples; ++n) {
+        for (std::size_t k = 0; k < taps; ++k) {
+            sumL[n] += left[k] * input[static_cast<Index>(n) - static_cast<Index>(k)];
+            sumR[n] += right[k] * input[static_cast<Index>(n) - static_cast<Index>(k)];
+        }
+    }
+}
+
 }  // namespace
 }  // namespace tessaly

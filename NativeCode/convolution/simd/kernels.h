@@ -83,6 +83,17 @@ struct Kernels {
                     bool onto,
                     ComplexBin* sumL,
                     ComplexBin* sumR);
+    /// sumL[n] += left[0] * input[n] + left[1] * input[n - 1] + ..., `taps` products, for n below
+    /// `samples`, and sumR with right. `input` has `taps` - 1 samples before its first. The tables
+    /// differ from each other by at most 2 (taps + 1) * 2^-24 of the sum of the products'
+    /// magnitudes.
+    void (*addTaps)(std::size_t samples,
+                    std::size_t taps,
+                    const float* left,
+                    const float* right,
+                    const float* input,
+                    float* sumL,
+                    float* sumR);
     /// Loops over samples.
     const SignalKernels* signal;
 };

@@ -76,6 +76,7 @@ constexpr Kernels table{.name = "avx2",
                         .add = addBins<Lanes8>,
                         .ringSum = sumRing<Lanes8>,
                         .listSum = sumList<Lanes8>,
+                        .addTaps = addTaps<Lanes8>,
                         .signal = &signalKernelsOf<Lanes8, Stereo2, AheadFour>};
 
 }  // namespace

@@ -91,6 +91,7 @@ constexpr Kernels table{.name = "avx512",
                         .add = addBins<Lanes16>,
                         .ringSum = sumRing<Lanes16>,
                         .listSum = sumList<Lanes16>,
+                        .addTaps = addTaps<Lanes16>,
                         .signal = &signalKernelsOf<Lanes16, Stereo4, AheadFour>};
 
 }  // namespace

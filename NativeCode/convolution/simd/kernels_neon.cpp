@@ -63,6 +63,7 @@ constexpr Kernels table{.name = "neon",
                         .add = addBins<LanesNeon>,
                         .ringSum = sumRing<LanesNeon>,
                         .listSum = sumList<LanesNeon>,
+                        .addTaps = addTaps<LanesNeon>,
                         .signal = &signalKernelsOf<LanesNeon, StereoNeon, AheadNeon>};
 
 }  // namespace

@@ -71,6 +71,7 @@ constexpr Kernels table{.name = "scalar",
                         .add = add,
                         .ringSum = ringSum,
                         .listSum = listSum,
+                        .addTaps = addTaps<LanesScalar>,
                         .signal = &signalKernelsOf<LanesScalar, StereoScalar, AheadScalar>};
 
 }  // namespace

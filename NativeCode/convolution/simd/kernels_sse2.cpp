@@ -61,6 +61,7 @@ constexpr Kernels table{.name = "sse2",
                         .add = addBins<Lanes4>,
                         .ringSum = sumRing<Lanes4>,
                         .listSum = sumList<Lanes4>,
+                        .addTaps = addTaps<Lanes4>,
                         .signal = &signalKernelsOf<Lanes4, Stereo1, AheadTwo>};
 
 }  // namespace
