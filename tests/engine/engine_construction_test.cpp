@@ -1,8 +1,11 @@
 // Building an engine: refusals, order, sizes, shared tables, destruction.
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cmath>
+#include <functional>
 #include <limits>
+#include <vector>
 
 #include "support/engine_rig.h"
 #include "support/log_capture.h"
@@ -277,6 +280,88 @@ TEST_F(EngineConstruction, StopClearsSignalsAndResponse) {
     for (int bin = 0; bin <= 256; ++bin) {
         ASSERT_EQ(rig.state().firstOLS->FDL[0][bin].re, 0.0f);
         ASSERT_EQ(rig.state().secondOLS->FDL[0][bin].re, 0.0f);
+    }
+}
+
+TEST_F(EngineConstruction, HoldsOnlyWhatItsSettingsUse) {
+    writeSets();
+    const auto held = [](EngineRig& rig) {
+        EngineState& state = rig.build().state();
+        EXPECT_TRUE(state.complete);
+        return std::vector<bool>{!state.frontEnd.doppler.dopplerLine.empty(),
+                                 !state.interpolation.interpFilterLeft[0].empty(),
+                                 !state.output.secondOutLeftBuffer.empty(),
+                                 !state.tail.reverbIR.empty(),
+                                 !state.debugDumpBuffer.empty(),
+                                 !state.ambience.atmoBuffer.empty()};
+    };
+    struct Case {
+        const char* name;
+        std::size_t index;  // size: none
+        std::function<void(EngineSettings&)> set;
+    };
+    const Case cases[] = {
+        {"nothing", 6, [](EngineSettings&) {}},
+        {"doppler", 0, [](EngineSettings& settings) { settings.doppler = 1; }},
+        {"interpolation", 1, [](EngineSettings& settings) { settings.qvInterpolateFilters = 1; }},
+        {"fading", 2, [](EngineSettings& settings) { settings.fading = 1; }},
+        {"tail", 3, [](EngineSettings& settings) { settings.qvReverb = 20; }},
+        {"dump", 4, [](EngineSettings& settings) { settings.debugDump = 1; }},
+        {"ambience", 5, [](EngineSettings& settings) { settings.atmoSelect = 1; }},
+    };
+    writePackedTails(directory.path(), 48000, {20});
+    for (const Case& c : cases) {
+        SCOPED_TRACE(c.name);
+        essError = essErrorNone;
+        LogCapture log;
+        EngineRig rig(directory.path(), 48000, 256);
+        rig.settings.doppler = 0;
+        rig.settings.fading = 0;
+        c.set(rig.settings);
+        std::vector<bool> wanted(6, false);
+        if (c.index < wanted.size()) {
+            wanted[c.index] = true;
+        }
+        EXPECT_EQ(held(rig), wanted);
+    }
+}
+
+TEST_F(EngineConstruction, AFreshEngineStartsFromSilence) {
+    writeSets();
+    writePackedTails(directory.path(), 48000, {20});
+    const auto isZero = [](const AlignedArray<float>& samples) {
+        return std::all_of(samples.begin(), samples.end(), [](float s) { return s == 0.0f; });
+    };
+    // The second one gets memory that the first one wrote to.
+    for (int life = 0; life < 3; ++life) {
+        LogCapture log;
+        EngineRig rig(directory.path(), 48000, 256);
+        rig.settings.qvReverb = 20;
+        rig.settings.fading = 1;
+        const EngineState& state = rig.build().state();
+        EXPECT_EQ(log.outputLines().back(), "___tessCore_Stop");
+        EXPECT_TRUE(isZero(state.frontEnd.inputHistoryBuffer));
+        EXPECT_TRUE(isZero(state.composer.filterLeftBuffer));
+        EXPECT_TRUE(isZero(state.composer.filterRightBuffer));
+        EXPECT_TRUE(isZero(state.output.firstOutLeftBuffer));
+        EXPECT_TRUE(isZero(state.output.firstOutRightBuffer));
+        EXPECT_TRUE(isZero(state.output.secondOutLeftBuffer));
+        EXPECT_TRUE(isZero(state.output.secondOutRightBuffer));
+        for (convClass* const convolver : {state.firstOLS.get(), state.secondOLS.get()}) {
+            for (const ComplexBin* const spectrum : convolver->FDL) {
+                for (int bin = 0; bin <= rig.blocklenght(); ++bin) {
+                    ASSERT_EQ(spectrum[bin].re, 0.0f);
+                    ASSERT_EQ(spectrum[bin].im, 0.0f);
+                }
+            }
+        }
+        rig.run();
+        EXPECT_EQ(rig.output, std::vector<float>(rig.output.size(), 0.0f));
+        std::fill(rig.input.begin(), rig.input.end(), 0.5f);
+        for (int block = 0; block < 20; ++block) {
+            rig.run();
+        }
+        EXPECT_NE(rig.output, std::vector<float>(rig.output.size(), 0.0f));
     }
 }
 
