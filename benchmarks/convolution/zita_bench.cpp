@@ -1,8 +1,9 @@
 // One block of zita-convolver under the same responses, still, mono to two ears.
-// Names: Convolver/still/<zita_uniform or zita_default>/<block length>/<taps>: all partitions of
-// the block's length in vector mode, or the partitions it chooses by itself and no option. In the
-// second form a thread for each larger partition size works beside the caller. A block here waits
-// for what they still owe, and the time is that of the processor for all threads of the program.
+// Names: Convolver/still/<zita_uniform, zita_measured or zita_default>/<block length>/<taps>: all
+// partitions of the block's length in vector mode, the same with transforms whose plans it
+// measures, or the partitions it chooses by itself and no option. In the last form a thread for
+// each larger partition size works beside the caller. A block here waits for what they still owe,
+// and the time is that of the processor for all threads of the program.
 #include <benchmark/benchmark.h>
 #include <unistd.h>
 #include <zita-convolver.h>
@@ -40,17 +41,25 @@ bool othersWait() {
     return true;
 }
 
+struct Form {
+    const char* name;
+    bool uniform;
+    std::uint32_t options;
+};
+constexpr Form forms[] = {
+    {"zita_uniform", true, Convproc::OPT_VECTOR_MODE},
+    {"zita_measured", true, Convproc::OPT_VECTOR_MODE | Convproc::OPT_FFTW_MEASURE},
+    {"zita_default", false, 0}};
+
 class Peer {
 public:
-    Peer(bool uniform, std::int32_t blockLength, std::int32_t taps)
+    Peer(const Form& form, std::int32_t blockLength, std::int32_t taps)
         : length_(static_cast<std::size_t>(blockLength)) {
         // Plans as it makes them, not those that another row has measured.
         fftwf_forget_wisdom();
         const auto block = static_cast<std::uint32_t>(blockLength);
-        const std::uint32_t largest = uniform ? block : std::uint32_t{Convproc::MAXPART};
-        if (uniform) {
-            process_.set_options(Convproc::OPT_VECTOR_MODE);
-        }
+        const std::uint32_t largest = form.uniform ? block : std::uint32_t{Convproc::MAXPART};
+        process_.set_options(form.options);
         good_ = process_.configure(1, 2, static_cast<std::uint32_t>(taps), block, block, largest,
                                    0.0f) == 0;
         for (unsigned ear = 0; ear < 2; ++ear) {
@@ -104,8 +113,11 @@ bool agrees(const Convolver& ours, const Peer& peer, std::int32_t blockLength) {
     return true;
 }
 
-void convolve(benchmark::State& state, bool uniform, std::int32_t blockLength, std::int32_t taps) {
-    Peer peer(uniform, blockLength, taps);
+void convolve(benchmark::State& state,
+              const Form& form,
+              std::int32_t blockLength,
+              std::int32_t taps) {
+    Peer peer(form, blockLength, taps);
     Convolver ours(blockLength, taps);
     InputBlocks input(blockLength);
     for (std::int32_t k = 0; k < taps; k += blockLength) {
@@ -126,11 +138,10 @@ void convolve(benchmark::State& state, bool uniform, std::int32_t blockLength, s
 const bool registered = [] {
     for (const std::int32_t blockLength : blockLengths) {
         for (const std::int32_t taps : tapCounts) {
-            for (const bool uniform : {true, false}) {
-                const std::string name = std::string("Convolver/still/") +
-                                         (uniform ? "zita_uniform/" : "zita_default/") +
+            for (const Form& form : forms) {
+                const std::string name = std::string("Convolver/still/") + form.name + "/" +
                                          std::to_string(blockLength) + "/" + std::to_string(taps);
-                benchmark::RegisterBenchmark(name.c_str(), convolve, uniform, blockLength, taps)
+                benchmark::RegisterBenchmark(name.c_str(), convolve, form, blockLength, taps)
                     ->MeasureProcessCPUTime();
             }
         }
