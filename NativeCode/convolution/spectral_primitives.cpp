@@ -8,6 +8,7 @@
 #include <new>
 
 #include "base/aligned_array.h"
+#include "base/aligned_memory.h"
 #include "base/ess_error.h"
 #include "base/log.h"
 #include "convolution/simd/kernels.h"
@@ -15,8 +16,6 @@
 
 namespace tessaly {
 namespace {
-
-constexpr std::size_t spectrumAlignment = 64;
 
 /// Takes one request from a count that tests may have limited.
 bool stillAllowed(std::int32_t& left) noexcept {
@@ -232,13 +231,8 @@ std::int32_t middleIFFT(const ComplexBin* input,
 void allocSpectrum(ComplexBin*& slot, std::int32_t count) noexcept {
     slot = nullptr;
     if (count > 0 && stillAllowed(spectralFaults.spectraLeft)) {
-        const std::size_t bytes = static_cast<std::size_t>(count) * sizeof(ComplexBin);
-        void* const memory =
-            ::operator new (bytes, std::align_val_t{spectrumAlignment}, std::nothrow);
-        if (memory != nullptr) {
-            std::memset(memory, 0, bytes);
-            slot = static_cast<ComplexBin*>(memory);
-        }
+        slot = static_cast<ComplexBin*>(
+            allocateZeroed(static_cast<std::size_t>(count) * sizeof(ComplexBin)));
     }
     if (slot == nullptr) {
         logTrace("Tessaly_c: calloc not sucessfull yet!");
@@ -251,7 +245,7 @@ void freeSpectrum(ComplexBin*& slot) noexcept {
         logTrace(">>DEBUG_CONV: can not delete ", static_cast<const void*>(slot));
         return;
     }
-    ::operator delete (slot, std::align_val_t{spectrumAlignment});
+    releaseAligned(slot);
     slot = nullptr;
 }
 
