@@ -2,31 +2,42 @@
 #pragma once
 
 #include <cstddef>
+#include <cstring>
 
 #include "base/audio_thread.h"
 
-#if defined(__SSE2__) || defined(_M_X64)
-#include <emmintrin.h>
-#define TESSALY_HAS_SSE2 1
+#if (defined(__SSE2__) || defined(__ARM_NEON)) && defined(__has_builtin)
+#if __has_builtin(__builtin_shufflevector)
+#define TESSALY_HAS_SHUFFLES 1
+#endif
 #endif
 
 namespace tessaly {
 
-// Four frames a step where the processor has the registers, then one by one, with the same results
-// bit for bit. The odd slots of `out` stay as they are. `in` and `out` do not overlap. Block time.
+// Four frames a step where compiler and processor have vectors, then one by one, with the same
+// results bit for bit. The odd slots of `out` stay as they are. `in` and `out` do not overlap.
+// Block time.
 
 namespace detail {
 
-#if defined(TESSALY_HAS_SSE2)
-inline __m128 evenOf(__m128 a, __m128 b) noexcept {
-    return _mm_shuffle_ps(a, b, _MM_SHUFFLE(2, 0, 2, 0));
+#if defined(TESSALY_HAS_SHUFFLES)
+using FourFloats = float __attribute__((vector_size(16)));
+
+inline FourFloats load(const float* p) noexcept {
+    FourFloats values;
+    std::memcpy(&values, p, sizeof values);
+    return values;
 }
-inline __m128 oddOf(__m128 a, __m128 b) noexcept {
-    return _mm_shuffle_ps(a, b, _MM_SHUFFLE(3, 1, 3, 1));
+inline void store(float* p, FourFloats values) noexcept { std::memcpy(p, &values, sizeof values); }
+inline FourFloats evenOf(FourFloats a, FourFloats b) noexcept {
+    return __builtin_shufflevector(a, b, 0, 2, 4, 6);
 }
-inline void storeEven(float* out, __m128 even, __m128 odd) noexcept {
-    _mm_storeu_ps(out, _mm_unpacklo_ps(even, odd));
-    _mm_storeu_ps(out + 4, _mm_unpackhi_ps(even, odd));
+inline FourFloats oddOf(FourFloats a, FourFloats b) noexcept {
+    return __builtin_shufflevector(a, b, 1, 3, 5, 7);
+}
+inline void storeEven(float* out, FourFloats even, FourFloats odd) noexcept {
+    store(out, __builtin_shufflevector(even, odd, 0, 4, 1, 5));
+    store(out + 4, __builtin_shufflevector(even, odd, 2, 6, 3, 7));
 }
 #endif
 
@@ -39,16 +50,13 @@ inline void blendToEven(const float* in,
                         float right,
                         float* out) noexcept TESSALY_NONBLOCKING {
     std::size_t i = 0;
-#if defined(TESSALY_HAS_SSE2)
-    const __m128 leftGain = _mm_set1_ps(left);
-    const __m128 rightGain = _mm_set1_ps(right);
+#if defined(TESSALY_HAS_SHUFFLES)
     for (; i + 4 <= frames; i += 4) {
-        const __m128 a = _mm_loadu_ps(in + 2 * i);
-        const __m128 b = _mm_loadu_ps(in + 2 * i + 4);
-        const __m128 odd = detail::oddOf(_mm_loadu_ps(out + 2 * i), _mm_loadu_ps(out + 2 * i + 4));
-        detail::storeEven(out + 2 * i,
-                          _mm_add_ps(_mm_mul_ps(detail::evenOf(a, b), leftGain),
-                                     _mm_mul_ps(detail::oddOf(a, b), rightGain)),
+        const detail::FourFloats a = detail::load(in + 2 * i);
+        const detail::FourFloats b = detail::load(in + 2 * i + 4);
+        const detail::FourFloats odd =
+            detail::oddOf(detail::load(out + 2 * i), detail::load(out + 2 * i + 4));
+        detail::storeEven(out + 2 * i, detail::evenOf(a, b) * left + detail::oddOf(a, b) * right,
                           odd);
     }
 #endif
@@ -62,10 +70,11 @@ inline void spreadToEven(const float* in,
                          std::size_t frames,
                          float* out) noexcept TESSALY_NONBLOCKING {
     std::size_t i = 0;
-#if defined(TESSALY_HAS_SSE2)
+#if defined(TESSALY_HAS_SHUFFLES)
     for (; i + 4 <= frames; i += 4) {
-        const __m128 odd = detail::oddOf(_mm_loadu_ps(out + 2 * i), _mm_loadu_ps(out + 2 * i + 4));
-        detail::storeEven(out + 2 * i, _mm_loadu_ps(in + i), odd);
+        const detail::FourFloats odd =
+            detail::oddOf(detail::load(out + 2 * i), detail::load(out + 2 * i + 4));
+        detail::storeEven(out + 2 * i, detail::load(in + i), odd);
     }
 #endif
     for (; i < frames; ++i) {
@@ -79,16 +88,14 @@ inline void addSumsToEven(const float* in,
                           float gain,
                           float* out) noexcept TESSALY_NONBLOCKING {
     std::size_t i = 0;
-#if defined(TESSALY_HAS_SSE2)
-    const __m128 factor = _mm_set1_ps(gain);
+#if defined(TESSALY_HAS_SHUFFLES)
     for (; i + 4 <= frames; i += 4) {
-        const __m128 a = _mm_loadu_ps(in + 2 * i);
-        const __m128 b = _mm_loadu_ps(in + 2 * i + 4);
-        const __m128 c = _mm_loadu_ps(out + 2 * i);
-        const __m128 d = _mm_loadu_ps(out + 2 * i + 4);
-        const __m128 sum = _mm_add_ps(detail::evenOf(a, b), detail::oddOf(a, b));
-        detail::storeEven(out + 2 * i, _mm_add_ps(detail::evenOf(c, d), _mm_mul_ps(sum, factor)),
-                          detail::oddOf(c, d));
+        const detail::FourFloats a = detail::load(in + 2 * i);
+        const detail::FourFloats b = detail::load(in + 2 * i + 4);
+        const detail::FourFloats c = detail::load(out + 2 * i);
+        const detail::FourFloats d = detail::load(out + 2 * i + 4);
+        const detail::FourFloats sum = detail::evenOf(a, b) + detail::oddOf(a, b);
+        detail::storeEven(out + 2 * i, detail::evenOf(c, d) + sum * gain, detail::oddOf(c, d));
     }
 #endif
     for (; i < frames; ++i) {
@@ -102,14 +109,12 @@ inline void addToEven(const float* in,
                       float gain,
                       float* out) noexcept TESSALY_NONBLOCKING {
     std::size_t i = 0;
-#if defined(TESSALY_HAS_SSE2)
-    const __m128 factor = _mm_set1_ps(gain);
+#if defined(TESSALY_HAS_SHUFFLES)
     for (; i + 4 <= frames; i += 4) {
-        const __m128 c = _mm_loadu_ps(out + 2 * i);
-        const __m128 d = _mm_loadu_ps(out + 2 * i + 4);
-        const __m128 product = _mm_mul_ps(_mm_loadu_ps(in + i), factor);
-        detail::storeEven(out + 2 * i, _mm_add_ps(detail::evenOf(c, d), product),
-                          detail::oddOf(c, d));
+        const detail::FourFloats c = detail::load(out + 2 * i);
+        const detail::FourFloats d = detail::load(out + 2 * i + 4);
+        const detail::FourFloats product = detail::load(in + i) * gain;
+        detail::storeEven(out + 2 * i, detail::evenOf(c, d) + product, detail::oddOf(c, d));
     }
 #endif
     for (; i < frames; ++i) {
