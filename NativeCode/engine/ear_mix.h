@@ -56,6 +56,11 @@ inline void addPairs(const EarBuffers& ears,
 struct EndFade {
     int frames;
     float step;
+
+    /// @param i  one of the last frames of a copy of `length`
+    float weightAt(int i, int length) const noexcept {
+        return 1.0f - static_cast<float>(i - length + frames + 1) * step;
+    }
 };
 
 /// Adds frame * gain through `filter` from `position` on, faded at its end. Each ear starts from
@@ -81,8 +86,7 @@ inline void addFilteredPairs(const EarBuffers& ears,
         ears.right[position + i] += rightFilter.process(pairs.rightAt(i) * gain);
     }
     for (int i = fadeBegin; i < range.end; ++i) {
-        const float weight =
-            1.0f - static_cast<float>(i - pairs.frames + fade.frames + 1) * fade.step;
+        const float weight = fade.weightAt(i, pairs.frames);
         ears.left[position + i] += leftFilter.process(pairs.leftAt(i) * gain) * weight;
         ears.right[position + i] += rightFilter.process(pairs.rightAt(i) * gain) * weight;
     }

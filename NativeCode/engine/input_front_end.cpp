@@ -1,12 +1,17 @@
 // Delay line and filters of the mono input, and the laws of their cut-offs.
 #include "engine/input_front_end.h"
 
+#include <algorithm>
+#include <array>
+#include <bit>
 #include <cmath>
 #include <cstddef>
+#include <cstdint>
 #include <cstring>
 
 #include "base/log.h"
 #include "base/precision.h"
+#include "convolution/sample_scan.h"
 
 namespace tessaly {
 
@@ -34,16 +39,67 @@ float lowCutAt(float distance) noexcept {
     return distance < 30.0f ? single(wide(distance * 170.0f) * perThirty + 10.0) : 180.0f;
 }
 
-/// As one pass of each over the block; interleaved, their recursions overlap in time.
-void runInSeries(Biquad& first, Biquad& second, float* samples, int count) noexcept {
-    Biquad a = first;
-    Biquad b = second;
-    for (int i = 0; i < count; ++i) {
-        samples[i] = b.process(a.process(samples[i]));
-    }
-    first = a;
-    second = b;
+/// Below this, 400 dB under full scale, a filter is taken to be at rest. What its state would still
+/// put out is at most a thousand times larger, at the lowest cut-off; a cut-off of zero, out of
+/// every law's range, lets it grow by as much again in each 20 ms.
+constexpr double restingState = 1e-20;
+
+bool isAtRest(const Biquad& filter) noexcept {
+    return std::fabs(filter.z1) < restingState && std::fabs(filter.z2) < restingState;
 }
+
+/// As allZero, for one channel of stereo frames.
+bool isSilent(const float* channel, int frames) noexcept {
+    constexpr int together = 16;  // frames between two looks at the result
+    int i = 0;
+    for (; i + together <= frames; i += together) {
+        std::uint32_t any = 0;
+        for (int k = 0; k < together; ++k) {
+            any |= std::bit_cast<std::uint32_t>(channel[std::ptrdiff_t{2} * (i + k)]);
+        }
+        if ((any << 1) != 0) {  // all but the sign
+            return false;
+        }
+    }
+    for (; i < frames; ++i) {
+        if (channel[std::ptrdiff_t{2} * i] != 0.0f) {
+            return false;
+        }
+    }
+    return true;
+}
+
+/// The filters that run in a block, in series.
+class FilterChain {
+public:
+    void add(Biquad& filter) noexcept { filters_[count_++] = &filter; }
+    bool isAtRest() const noexcept {
+        return std::all_of(filters_.begin(), filters_.begin() + count_,
+                           [](const Biquad* filter) { return tessaly::isAtRest(*filter); });
+    }
+    void clear() noexcept {
+        for (std::size_t k = 0; k < count_; ++k) {
+            filters_[k]->clear();
+        }
+    }
+    void run(const SignalKernels& kernels, float* samples, int count) noexcept {
+        std::array<RunningSection, capacity> series;
+        for (std::size_t k = 0; k < count_; ++k) {
+            const Biquad& f = *filters_[k];
+            series[k] = {{f.b0, f.b1, f.b2, f.a1, f.a2}, f.z1, f.z2};
+        }
+        kernels.filterSeries(static_cast<std::size_t>(count), samples, count_, series.data());
+        for (std::size_t k = 0; k < count_; ++k) {
+            filters_[k]->z1 = series[k].z1;
+            filters_[k]->z2 = series[k].z2;
+        }
+    }
+
+private:
+    static constexpr std::size_t capacity = 4;
+    std::array<Biquad*, capacity> filters_{};
+    std::size_t count_ = 0;
+};
 
 }  // namespace
 
@@ -61,6 +117,7 @@ void InputFrontEnd::prepareWindow(int blocklenght) {
     blocklenght_ = blocklenght;
     inputHistoryBuffer = AlignedArray<float>(2 * static_cast<std::size_t>(blocklenght));
     inputHistory = inputHistoryBuffer.data();
+    silentBlocks_ = 0;
 }
 
 void InputFrontEnd::process(const float* input,
@@ -74,26 +131,53 @@ void InputFrontEnd::process(const float* input,
     }
     const int B = blocklenght_;
     float* const block = inputHistory + B;
-    std::memcpy(inputHistory, block, static_cast<std::size_t>(B) * sizeof(float));
-
-    inputGain = 1.0f;
     const float* const channel = input + inputChannel;
+    inputGain = 1.0f;
+
+    FilterChain chain;
+    if (bassBoost) {
+        chain.add(bassShelveFilter);
+    }
+    if (inputLowPassLevel > 0.0f) {
+        chain.add(inputLowPass);
+    }
+    // In this order: it can be heard while the distance moves both cut-offs.
+    chain.add(highCutFilter);
+    chain.add(lowCutFilter);
+
+    if (!dopplerOn && chain.isAtRest() && isSilent(channel, B)) {
+        chain.clear();
+        keepSilence();
+        return;
+    }
+    std::memcpy(inputHistory, block, static_cast<std::size_t>(B) * sizeof(float));
+    silentBlocks_ = 0;
     if (dopplerOn) {
         doppler.process(channel, inputGain, distance, distanceOld, block);
+        if (chain.isAtRest() && allZero(block, static_cast<std::size_t>(B))) {
+            chain.clear();
+            std::memset(block, 0, static_cast<std::size_t>(B) * sizeof(float));
+            return;
+        }
     } else {
         for (int i = 0; i < B; ++i) {
             block[i] = channel[std::ptrdiff_t{2} * i] * inputGain;
         }
     }
+    chain.run(*kernels_, block, B);
+}
 
-    if (bassBoost) {
-        bassShelveFilter.processInPlace(block, B);
+/// Moves the window on by a block of zeros, as far as it does not hold them already.
+void InputFrontEnd::keepSilence() noexcept {
+    const std::size_t bytes = static_cast<std::size_t>(blocklenght_) * sizeof(float);
+    float* const block = inputHistory + blocklenght_;
+    if (silentBlocks_ == 0) {
+        std::memcpy(inputHistory, block, bytes);
+        std::memset(block, 0, bytes);
+    } else if (silentBlocks_ == 1) {
+        std::memset(inputHistory, 0, bytes);
     }
-    if (inputLowPassLevel > 0.0f) {
-        inputLowPass.processInPlace(block, B);
-    }
-    // In this order: it can be heard while the distance moves both cut-offs.
-    runInSeries(highCutFilter, lowCutFilter, block, B);
+    silentBlocks_ = std::min(silentBlocks_ + 1, 2);
 }
 
 void InputFrontEnd::followDistance(float distance) noexcept {

@@ -3,6 +3,7 @@
 
 #include "base/aligned_array.h"
 #include "base/audio_thread.h"
+#include "convolution/simd/kernels.h"
 #include "engine/biquad.h"
 #include "engine/doppler_line.h"
 
@@ -15,7 +16,8 @@ public:
     /// Load time: allocates the window of 2 * `blocklenght` floats.
     void prepareWindow(int blocklenght);
 
-    /// One block of input into the upper half of `inputHistory`. Block time.
+    /// One block of input into the upper half of `inputHistory`. Silence through filters that have
+    /// come to rest is not computed. Block time.
     /// @param input         interleaved stereo, `blocklenght` frames
     /// @param inputChannel  0 or 1: which slot of a frame is read
     void process(const float* input,
@@ -47,6 +49,10 @@ public:
     DopplerLine doppler;
 
 private:
+    void keepSilence() noexcept;
+
+    const SignalKernels* kernels_ = selectKernels().signal;
+    int silentBlocks_ = 0;  ///< newest blocks in the window that are zero throughout, 2 at most
     int sampleRate_ = 0;
     int blocklenght_ = 0;
 };

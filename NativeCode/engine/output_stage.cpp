@@ -14,6 +14,14 @@ constexpr float rampStep = 0.015873017f;    // 1 / 63, in single precision
 constexpr float compensatedDivisor = 3.0f;  // room for a headphone filter's gain
 constexpr double atmoGain = 1.45;
 
+/// @param rising   weights of the new output
+/// @param falling  weights of the old one
+void fade(const float* rising, const float* falling, const float* old, float* output, int count) {
+    for (int i = 0; i < count; ++i) {
+        output[i] = falling[i] * old[i] + rising[i] * output[i];
+    }
+}
+
 }  // namespace
 
 void OutputStage::prepare(int blocklenght, bool fading) {
@@ -56,14 +64,9 @@ void OutputStage::crossfade() noexcept {
     const float* rising = crossfadeRamp.data();
     const float* falling = rising + crossfadeLength;
     const int count = std::min<int>(crossfadeLength, blocklenght_);
-    float* newLeft = firstOutLeft + blocklenght_;
-    float* newRight = firstOutRight + blocklenght_;
-    const float* oldLeft = secondOutLeft + blocklenght_;
-    const float* oldRight = secondOutRight + blocklenght_;
-    for (int i = 0; i < count; ++i) {
-        newLeft[i] = falling[i] * oldLeft[i] + rising[i] * newLeft[i];
-        newRight[i] = falling[i] * oldRight[i] + rising[i] * newRight[i];
-    }
+    const int B = blocklenght_;
+    fade(rising, falling, secondOutLeft + B, firstOutLeft + B, count);
+    fade(rising, falling, secondOutRight + B, firstOutRight + B, count);
 }
 
 void OutputStage::write(float* output,
@@ -75,10 +78,7 @@ void OutputStage::write(float* output,
     const float* right = firstOutRight + blocklenght_;
     const float* bed = atmoSelect != 0 ? ambience.block(block) : nullptr;
     if (bed == nullptr) {
-        for (int i = 0; i < blocklenght_; ++i) {
-            output[2 * i] = left[i] * scale;
-            output[2 * i + 1] = right[i] * scale;
-        }
+        kernels_->interleave(static_cast<std::size_t>(blocklenght_), left, right, scale, output);
         return;
     }
     for (int i = 0; i < blocklenght_; ++i) {

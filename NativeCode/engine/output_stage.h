@@ -3,6 +3,7 @@
 
 #include "base/aligned_array.h"
 #include "base/audio_thread.h"
+#include "convolution/simd/kernels.h"
 #include "engine/ambience.h"
 
 namespace tessaly {
@@ -46,6 +47,7 @@ public:
     float outputNormalisation = 1.0f;  ///< divisor of every output sample
 
 private:
+    const SignalKernels* kernels_ = selectKernels().signal;
     int blocklenght_ = 0;
 };
 

@@ -19,12 +19,38 @@ EarPairs pairsOf(const ResponsePiece& piece) noexcept {
 }
 
 /// Written, not added. Both gains are applied one after the other.
-void writeDirect(const EarBuffers& ears, const ResponsePiece& piece) noexcept {
-    const EarPairs pairs = pairsOf(piece);
-    const FrameRange range = framesInside(piece.position, pairs.frames, ears.size);
-    for (int i = range.begin; i < range.end; ++i) {
-        ears.left[piece.position + i] = pairs.leftAt(i) * piece.gain * piece.secondGain;
-        ears.right[piece.position + i] = pairs.rightAt(i) * piece.gain * piece.secondGain;
+void writeDirect(const SignalKernels& kernels,
+                 const EarBuffers& ears,
+                 const ResponsePiece& piece) noexcept {
+    const FrameRange range = framesInside(piece.position, piece.frames, ears.size);
+    if (range.begin < range.end) {
+        const int start = piece.position + range.begin;
+        kernels.writePairs(static_cast<std::size_t>(range.end - range.begin),
+                           piece.hrir + std::ptrdiff_t{2} * range.begin, piece.gain,
+                           piece.secondGain, ears.right + start, ears.left + start);
+    }
+}
+
+/// @param pairs  in the order of an HRIR
+void addGained(const SignalKernels& kernels,
+               const EarBuffers& ears,
+               const ResponsePiece& piece,
+               const float* pairs) noexcept {
+    const FrameRange range = framesInside(piece.position, piece.frames, ears.size);
+    if (range.begin < range.end) {
+        const int start = piece.position + range.begin;
+        kernels.addPairs(static_cast<std::size_t>(range.end - range.begin),
+                         pairs + std::ptrdiff_t{2} * range.begin, piece.gain, ears.right + start,
+                         ears.left + start);
+    }
+}
+
+/// Both ears' last frames.
+void fadeEnd(float* pairs, int frames) noexcept {
+    for (int i = std::max(frames - reflectionFade.frames, 0); i < frames; ++i) {
+        const float weight = reflectionFade.weightAt(i, frames);
+        pairs[std::ptrdiff_t{2} * i] *= weight;
+        pairs[std::ptrdiff_t{2} * i + 1] *= weight;
     }
 }
 
@@ -86,67 +112,82 @@ void PieceWriter::prepare(int hrirLength) {
     forget();
 }
 
-void PieceWriter::forget() noexcept {
-    for (Kept& kept : kept_) {
-        kept.valid = false;
-    }
-}
+void PieceWriter::forget() noexcept { kept_.fill({}); }
 
 void PieceWriter::write(const EarBuffers& ears,
                         const PieceList& pieces,
                         int sampleRate,
                         std::array<Biquad, 2>& filters) noexcept {
+    refresh(pieces, sampleRate, filters);
     std::size_t slot = 0;
     for (const ResponsePiece& piece : pieces) {
         switch (piece.kind) {
             case ResponsePiece::Kind::Direct:
-                writeDirect(ears, piece);
+                writeDirect(*kernels_, ears, piece);
                 break;
             case ResponsePiece::Kind::Fixed:
                 addFixed(ears, piece);
                 break;
             case ResponsePiece::Kind::Plain:
-                addPairs(ears, piece.position, pairsOf(piece), piece.gain);
+                addGained(*kernels_, ears, piece, piece.hrir);
                 break;
             case ResponsePiece::Kind::Filtered:
-                addFiltered(ears, piece, slot, sampleRate, filters[piece.filterClass == 0 ? 0 : 1]);
+                if (isKept(piece)) {
+                    addGained(*kernels_, ears, piece, keptPairs(slot));
+                } else {
+                    Biquad& filter = filterOf(piece, filters);
+                    filter.follow(Biquad::normalise(piece.cutOff, sampleRate));
+                    addFilteredPairs(ears, piece.position, pairsOf(piece), piece.gain, filter,
+                                     reflectionFade);
+                }
                 break;
         }
         ++slot;
     }
 }
 
-/// The place of a piece does not touch what the filter makes of it, so a reflection whose delay
-/// alone follows the source is not filtered again.
-void PieceWriter::addFiltered(const EarBuffers& ears,
-                              const ResponsePiece& piece,
-                              std::size_t slot,
-                              int sampleRate,
-                              Biquad& filter) noexcept {
-    filter.follow(Biquad::normalise(piece.cutOff, sampleRate));
-    if (piece.frames > framesKept_) {
-        addFilteredPairs(ears, piece.position, pairsOf(piece), piece.gain, filter, reflectionFade);
-        return;
+Biquad& PieceWriter::filterOf(const ResponsePiece& piece, std::array<Biquad, 2>& filters) noexcept {
+    return filters[piece.filterClass == 0 ? 0 : 1];
+}
+
+/// Filters the pieces that are not kept as they are wanted, side by side as far as they are equally
+/// long. Neither the place of a piece nor its gain touches what is kept of it, so a reflection
+/// whose delay and level alone follow the source is not filtered again.
+void PieceWriter::refresh(const PieceList& pieces,
+                          int sampleRate,
+                          std::array<Biquad, 2>& filters) noexcept {
+    std::array<PairFilter, PieceList::capacity> due{};
+    std::size_t count = 0;
+    int frames = 0;
+    const auto run = [&]() noexcept {
+        kernels_->filterPairs(static_cast<std::size_t>(frames), count, due.data());
+        for (std::size_t k = 0; k < count; ++k) {
+            fadeEnd(due[k].output, frames);
+        }
+        count = 0;
+    };
+    std::size_t slot = 0;
+    for (const ResponsePiece& piece : pieces) {
+        if (piece.kind == ResponsePiece::Kind::Filtered && isKept(piece)) {
+            Biquad& filter = filterOf(piece, filters);
+            filter.follow(Biquad::normalise(piece.cutOff, sampleRate));
+            filter.clear();
+            const Kept wanted{piece.hrir, piece.frames, piece.cutOff, piece.filterClass};
+            if (!(kept_[slot] == wanted)) {
+                kept_[slot] = wanted;
+                if (piece.frames != frames) {
+                    run();
+                    frames = piece.frames;
+                }
+                due[count] = {piece.hrir,
+                              keptPairs(slot),
+                              {filter.b0, filter.b1, filter.b2, filter.a1, filter.a2}};
+                ++count;
+            }
+        }
+        ++slot;
     }
-    const auto stride = static_cast<std::size_t>(framesKept_);
-    float* const left = samples_.data() + 2 * slot * stride;
-    float* const right = left + stride;
-    Kept& kept = kept_[slot];
-    ResponsePiece wanted = piece;
-    wanted.position = 0;
-    if (!kept.valid || !(kept.piece == wanted)) {
-        std::fill_n(left, piece.frames, 0.0f);
-        std::fill_n(right, piece.frames, 0.0f);
-        addFilteredPairs({left, right, piece.frames}, 0, pairsOf(piece), piece.gain, filter,
-                         reflectionFade);
-        kept.piece = wanted;
-        kept.valid = true;
-    }
-    const FrameRange range = framesInside(piece.position, piece.frames, ears.size);
-    for (int i = range.begin; i < range.end; ++i) {
-        ears.left[piece.position + i] += left[i];
-        ears.right[piece.position + i] += right[i];
-    }
+    run();
 }
 
 }  // namespace tessaly

@@ -6,6 +6,7 @@
 
 #include "base/aligned_array.h"
 #include "base/audio_thread.h"
+#include "convolution/simd/kernels.h"
 #include "engine/ear_mix.h"
 #include "engine/reflections.h"
 
@@ -60,7 +61,7 @@ private:
     int count_ = 0;
 };
 
-/// Writes pieces into a response; what a filter made of a piece is kept until the piece changes.
+/// Writes pieces into a response; what a filter made of an HRIR is kept until one of both changes.
 class PieceWriter {
 public:
     /// Memory for filtered pieces of up to `hrirLength` frames. Load time: allocates.
@@ -77,19 +78,26 @@ public:
                std::array<Biquad, 2>& filters) noexcept TESSALY_NONBLOCKING;
 
 private:
+    /// What decides the samples that are kept; no HRIR: none are.
     struct Kept {
-        ResponsePiece piece;
-        bool valid = false;
+        const float* hrir = nullptr;
+        int frames = 0;
+        float cutOff = 0.0f;
+        std::uint8_t filterClass = 0;
+
+        bool operator==(const Kept&) const = default;
     };
 
-    void addFiltered(const EarBuffers& ears,
-                     const ResponsePiece& piece,
-                     std::size_t slot,
-                     int sampleRate,
-                     Biquad& filter) noexcept;
+    bool isKept(const ResponsePiece& piece) const noexcept { return piece.frames <= framesKept_; }
+    float* keptPairs(std::size_t slot) noexcept {
+        return samples_.data() + 2 * slot * static_cast<std::size_t>(framesKept_);
+    }
+    static Biquad& filterOf(const ResponsePiece& piece, std::array<Biquad, 2>& filters) noexcept;
+    void refresh(const PieceList& pieces, int sampleRate, std::array<Biquad, 2>& filters) noexcept;
 
+    const SignalKernels* kernels_ = selectKernels().signal;
     std::array<Kept, PieceList::capacity> kept_{};
-    AlignedArray<float> samples_;  ///< per slot the left ear's frames and then the right ear's
+    AlignedArray<float> samples_;  ///< per slot the filtered pairs, faded, without a gain
     int framesKept_ = 0;
 };
 
