@@ -45,7 +45,7 @@ MODULE = re.compile(r"\btessaly_(\w+)\b")
 SOURCES = {".h", ".cpp"}
 
 KERNEL_FOLDER = "convolution/simd"
-NO_KERNEL = {"dispatch.cpp", "kernels.h"}  # built for every machine, or plain declarations
+NO_KERNEL = {"dispatch.cpp", "kernels.h", "signal_kernels.h"}  # plain code or declarations
 # What a text is made of as far as namespaces go; strings hold no braces in such headers.
 TOKEN = re.compile(r"namespace(?:\s+\w+(?:::\w+)*)?\s*\{|\{|\}|[^\s{}]+")
 
