@@ -46,6 +46,7 @@ struct AheadNeon {
     static Pair loadPair(const double* p) { return vld1q_f64(p); }
     static void storePair(double* p, Pair a) { vst1q_f64(p, a); }
     static Pair multiply(Pair a, Pair b) { return vmulq_f64(a, b); }
+    static Pair add(Pair a, Pair b) { return vaddq_f64(a, b); }
     static Pair multiplyAdd(Pair a, Pair b, Pair c) { return vfmaq_f64(c, a, b); }
     static Pair swapped(Pair a) { return vextq_f64(a, a, 1); }
 
@@ -65,6 +66,7 @@ struct AheadNeon {
     static Four highTwice(Four a) { return {a.high, a.high}; }
     static Four twice(Pair a) { return {a, a}; }
     static Four swapped(Four a) { return {swapped(a.low), swapped(a.high)}; }
+    static Four add(Four a, Four b) { return {add(a.low, b.low), add(a.high, b.high)}; }
     static Four multiply(Four a, Four b) {
         return {multiply(a.low, b.low), multiply(a.high, b.high)};
     }

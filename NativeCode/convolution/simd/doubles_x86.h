@@ -56,6 +56,7 @@ struct AheadTwo {
     static Pair loadPair(const double* p) { return _mm_loadu_pd(p); }
     static void storePair(double* p, Pair a) { _mm_storeu_pd(p, a); }
     static Pair multiply(Pair a, Pair b) { return _mm_mul_pd(a, b); }
+    static Pair add(Pair a, Pair b) { return _mm_add_pd(a, b); }
     static Pair multiplyAdd(Pair a, Pair b, Pair c) { return _mm_add_pd(_mm_mul_pd(a, b), c); }
     static Pair swapped(Pair a) { return _mm_shuffle_pd(a, a, 1); }
 
@@ -75,6 +76,7 @@ struct AheadTwo {
     static Four highTwice(Four a) { return {a.high, a.high}; }
     static Four twice(Pair a) { return {a, a}; }
     static Four swapped(Four a) { return {swapped(a.low), swapped(a.high)}; }
+    static Four add(Four a, Four b) { return {add(a.low, b.low), add(a.high, b.high)}; }
     static Four multiply(Four a, Four b) {
         return {multiply(a.low, b.low), multiply(a.high, b.high)};
     }
@@ -127,6 +129,7 @@ struct AheadFour {
     static Pair loadPair(const double* p) { return _mm_loadu_pd(p); }
     static void storePair(double* p, Pair a) { _mm_storeu_pd(p, a); }
     static Pair multiply(Pair a, Pair b) { return _mm_mul_pd(a, b); }
+    static Pair add(Pair a, Pair b) { return _mm_add_pd(a, b); }
     static Pair multiplyAdd(Pair a, Pair b, Pair c) { return _mm_fmadd_pd(a, b, c); }
     static Pair swapped(Pair a) { return _mm_permute_pd(a, 1); }
 
@@ -139,6 +142,7 @@ struct AheadFour {
     static Four highTwice(Four a) { return _mm256_permute2f128_pd(a, a, 0x11); }
     static Four twice(Pair a) { return _mm256_insertf128_pd(_mm256_castpd128_pd256(a), a, 1); }
     static Four swapped(Four a) { return _mm256_permute_pd(a, 0x5); }
+    static Four add(Four a, Four b) { return _mm256_add_pd(a, b); }
     static Four multiply(Four a, Four b) { return _mm256_mul_pd(a, b); }
     static Four multiplyAdd(Four a, Four b, Four c) { return _mm256_fmadd_pd(a, b, c); }
 };

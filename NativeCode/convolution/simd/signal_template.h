@@ -7,7 +7,7 @@
 // and one for look-ahead, if looksAhead,
 //   Pair (2 doubles), Four (4 doubles), loadPair, storePair, loadFour, singles (4 floats, widened),
 //   storeSingles, rounded (to single and back), low, lowTwice, highTwice, twice, swapped (within
-//   each pair), multiply, multiplyAdd(a, b, c) = a b + c.
+//   each pair), add, multiply, multiplyAdd(a, b, c) = a b + c.
 #pragma once
 
 #include "convolution/simd/kernel_template.h"
@@ -200,18 +200,25 @@ TESSALY_KERNEL_INLINE typename Lanes::Four stepLookAhead(typename Lanes::Four x,
     const Four z = Lanes::twice(state);
     const Pair stateSwapped = Lanes::swapped(state);
 
-    Four y = Lanes::multiply(low, four(matrices.outputFromLow[0]));
-    y = Lanes::multiplyAdd(lowSwapped, four(matrices.outputFromLow[1]), y);
-    y = Lanes::multiplyAdd(high, four(matrices.outputFromHigh[0]), y);
-    y = Lanes::multiplyAdd(highSwapped, four(matrices.outputFromHigh[1]), y);
-    y = Lanes::multiplyAdd(z, four(matrices.outputFromState[0]), y);
-    y = Lanes::multiplyAdd(Lanes::swapped(z), four(matrices.outputFromState[1]), y);
+    // Short chains: what waits for a result blocks what could run beside it.
+    const Four fromLow = Lanes::multiplyAdd(lowSwapped, four(matrices.outputFromLow[1]),
+                                            Lanes::multiply(low, four(matrices.outputFromLow[0])));
+    const Four fromHigh =
+        Lanes::multiplyAdd(highSwapped, four(matrices.outputFromHigh[1]),
+                           Lanes::multiply(high, four(matrices.outputFromHigh[0])));
+    const Four fromState =
+        Lanes::multiplyAdd(Lanes::swapped(z), four(matrices.outputFromState[1]),
+                           Lanes::multiply(z, four(matrices.outputFromState[0])));
+    const Four y = Lanes::add(Lanes::add(fromLow, fromHigh), fromState);
 
-    Pair next = Lanes::multiply(Lanes::low(low), pair(matrices.stateFromLow[0]));
-    next = Lanes::multiplyAdd(Lanes::low(lowSwapped), pair(matrices.stateFromLow[1]), next);
-    next = Lanes::multiplyAdd(Lanes::low(high), pair(matrices.stateFromHigh[0]), next);
-    next = Lanes::multiplyAdd(Lanes::low(highSwapped), pair(matrices.stateFromHigh[1]), next);
-    next = Lanes::multiplyAdd(state, pair(matrices.stateFromState[0]), next);
+    const Pair nextFromLow =
+        Lanes::multiplyAdd(Lanes::low(lowSwapped), pair(matrices.stateFromLow[1]),
+                           Lanes::multiply(Lanes::low(low), pair(matrices.stateFromLow[0])));
+    const Pair nextFromHigh =
+        Lanes::multiplyAdd(Lanes::low(highSwapped), pair(matrices.stateFromHigh[1]),
+                           Lanes::multiply(Lanes::low(high), pair(matrices.stateFromHigh[0])));
+    const Pair next = Lanes::multiplyAdd(state, pair(matrices.stateFromState[0]),
+                                         Lanes::add(nextFromLow, nextFromHigh));
     state = Lanes::multiplyAdd(stateSwapped, pair(matrices.stateFromState[1]), next);
     return y;
 }
@@ -225,18 +232,38 @@ void filterSeriesAhead(std::size_t count, float* samples, RunningSection* series
         const double z[2] = {series[s].z1, series[s].z2};
         state[s] = Lanes::loadPair(z);
     }
-    std::size_t i = 0;
-    for (; i + 4 <= count; i += 4) {
-        typename Lanes::Four x = Lanes::singles(samples + i);
-        TESSALY_KERNEL_UNROLL
-        for (int s = 0; s < Sections; ++s) {
-            x = stepLookAhead<Lanes>(x, matrices[s], state[s]);
-            if (s + 1 < Sections) {
-                x = Lanes::rounded(x);
-            }
+    // Each section works one group of four behind the one before it, so that none waits for
+    // another.
+    typename Lanes::Four waiting[Sections];
+    const auto advance = [&](std::size_t group, int s) {
+        const auto section = static_cast<std::size_t>(s);
+        const typename Lanes::Four y =
+            stepLookAhead<Lanes>(s == 0 ? Lanes::singles(samples + 4 * group) : waiting[section],
+                                 matrices[section], state[section]);
+        if (s + 1 < Sections) {
+            waiting[section + 1] = Lanes::rounded(y);
+        } else {
+            Lanes::storeSingles(samples + 4 * (group - section), y);
         }
-        Lanes::storeSingles(samples + i, x);
+    };
+    const std::size_t groups = count / 4;
+    for (std::size_t group = 0; group + 1 < Sections; ++group) {
+        for (int s = static_cast<int>(group); s >= 0; --s) {
+            advance(group, s);
+        }
     }
+    for (std::size_t group = Sections - 1; group < groups; ++group) {
+        TESSALY_KERNEL_UNROLL
+        for (int s = Sections - 1; s >= 0; --s) {
+            advance(group, s);
+        }
+    }
+    for (std::size_t group = groups; group < groups + Sections - 1; ++group) {
+        for (int s = Sections - 1; s > static_cast<int>(group - groups); --s) {
+            advance(group, s);
+        }
+    }
+    const std::size_t i = 4 * groups;
     for (int s = 0; s < Sections; ++s) {
         double z[2];
         Lanes::storePair(z, state[s]);
@@ -246,7 +273,7 @@ void filterSeriesAhead(std::size_t count, float* samples, RunningSection* series
     filterSeriesPlain<Sections>(count - i, samples + i, series);
 }
 
-inline constexpr std::size_t fewestAhead = 16;  // samples that are worth the matrices
+inline constexpr std::size_t fewestAhead = 16;  // samples that are worth the matrices; 4 groups
 
 template <class Lanes, int Sections>
 void filterSeriesOf(std::size_t count, float* samples, RunningSection* series) {
