@@ -174,7 +174,7 @@ def as_markdown(table):
     def row(cells):
         return "| " + " | ".join(cells) + " |"
 
-    text = [f"### {table.title}", "", row(table.head), row(["--:"] * len(table.head))]
+    text = [f"### {table.title}", "", row(table.head), row([":--"] + ["--:"] * (len(table.head) - 1))]
     text += [row(line) for line in table.lines]
     if table.notes:
         text += ["", *(f"- {note}" for note in table.notes)]
