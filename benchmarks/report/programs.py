@@ -112,7 +112,11 @@ def machine(cpu, folder):
 
     compiler = entry("CMAKE_CXX_COMPILER") or "c++"
     version = run([compiler, "--version"], capture_output=True, text=True).stdout.split("\n")[0]
-    commit = run(["git", "rev-parse", "--short", "HEAD"], cwd=ROOT, capture_output=True, text=True)
+    # Programs of another folder may be of any state.
+    commit = "unknown"
+    if Path(folder) == BUILD / "bin":
+        describe = ["git", "describe", "--always", "--dirty", "--exclude=*"]
+        commit = run(describe, cwd=ROOT, capture_output=True, text=True).stdout.strip()
     return {
         "processor": model,
         "cores": os.cpu_count(),
@@ -121,5 +125,5 @@ def machine(cpu, folder):
         "load_average": os.getloadavg()[0],
         "compiler": version,
         "flags": f"{entry('CMAKE_CXX_FLAGS')} {entry('CMAKE_CXX_FLAGS_RELEASE')}".strip(),
-        "commit": commit.stdout.strip(),
+        "commit": commit,
     }
