@@ -1,6 +1,7 @@
 // Tells blocks of nothing but zeros, which most of a game's sources play most of the time.
 #pragma once
 
+#include <bit>
 #include <cstddef>
 #include <cstdint>
 #include <cstring>
@@ -20,6 +21,28 @@ inline bool isSilent(const float* samples, std::size_t count) noexcept TESSALY_N
     std::memcpy(&first, samples, sizeof first);
     // All are zero if the first one is and each of the others equals the one before it.
     return first == 0 && std::memcmp(samples, samples + 1, (count - 1) * sizeof(float)) == 0;
+}
+
+/// All samples are zero, of either sign. Stops soon after the first that is not. Block time.
+inline bool allZero(const float* samples, std::size_t count) noexcept {
+    constexpr std::size_t group = 64;
+    constexpr std::uint32_t withoutSign = 0x7fffffffu;
+    std::size_t i = 0;
+    for (; i + group <= count; i += group) {
+        std::uint32_t bits = 0;
+        for (std::size_t k = 0; k < group; ++k) {
+            bits |= std::bit_cast<std::uint32_t>(samples[i + k]);
+        }
+        if ((bits & withoutSign) != 0) {
+            return false;
+        }
+    }
+    for (; i < count; ++i) {
+        if (samples[i] != 0.0f) {
+            return false;
+        }
+    }
+    return true;
 }
 
 }  // namespace tessaly

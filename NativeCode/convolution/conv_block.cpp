@@ -1,8 +1,8 @@
 // One block of partitioned convolution, plain or with a crossfade.
 #include <algorithm>
 
+#include "base/silence.h"
 #include "convolution/conv_class.h"
-#include "convolution/sample_scan.h"
 #include "convolution/simd/kernels.h"
 
 namespace tessaly {
@@ -11,13 +11,11 @@ float* convClass::process() noexcept {
     watchSelection();
     // In a crossfade block the first instance works on the spectrum that the second one made.
     const bool borrowed = secondOLSactive && isSecondInstance == 0;
-    if (!borrowed) {
-        takeInput(blockNumber());
-    }
+    const bool silent = !borrowed && takeInput(blockNumber());
     if ((filterChangeAll || forceUpdateAll) && isSecondInstance == 0) {
         updateFilter();
     }
-    advanceFarTail();
+    advanceFarTail(silent);
     const RingView ring = borrowed ? RingView{FDL, nullptr, newestSlot()} : ownRing();
     render(ring, partner_ != nullptr ? partner_->ownRing() : ring);
     return outputL;
@@ -28,8 +26,8 @@ std::uint64_t convClass::blockNumber() const noexcept {
     return far_ != nullptr ? far_->block() + 1 : InputRing::noBlock;
 }
 
-/// A window of zeros has a spectrum of zeros.
-void convClass::takeInput(std::uint64_t block) noexcept {
+/// A window of zeros has a spectrum of zeros. @return whether it is one
+bool convClass::takeInput(std::uint64_t block) noexcept {
     const std::size_t slot = newestSlot();
     ComplexBin* const spectrum = FDL[slot];
     const bool silent = fftHandle != nullptr && input != nullptr && spectrum != nullptr &&
@@ -43,6 +41,7 @@ void convClass::takeInput(std::uint64_t block) noexcept {
         dftiStatus = FFT(input, spectrum, fftHandle);
     }
     ring_.set(slot, silent, dftiStatus == transformOk ? block : InputRing::noBlock);
+    return silent;
 }
 
 convClass::RingView convClass::ownRing() const noexcept {
@@ -246,7 +245,7 @@ void convClass::processCrossfade(convClass& second, std::int32_t heardOfOld) noe
         return;
     }
     second.watchSelection();
-    second.takeInput(blockNumber());
+    const bool silent = second.takeInput(blockNumber());
     watchSelection();
     const bool update = filterChangeAll || forceUpdateAll;
     if (update && hpTFactive) {
@@ -259,7 +258,7 @@ void convClass::processCrossfade(convClass& second, std::int32_t heardOfOld) noe
         findChangedPartitions();
         scaled_ = scaledNow();
     }
-    advanceFarTail();
+    advanceFarTail(silent);
     const RingView ring = second.ownRing();
     const std::int32_t heard = std::clamp(heardOfOld, 0, blockLength);
     if (changedCount_ > 0 && ring.state->silent()) {

@@ -9,7 +9,7 @@
 #include "base/ess_error.h"
 #include "base/log.h"
 #include "base/process_lifetime.h"
-#include "convolution/sample_scan.h"
+#include "base/silence.h"
 #include "convolution/simd/kernels.h"
 #include "convolution/spectrum_stride.h"
 

@@ -222,9 +222,9 @@ private:
     ScaledPartitions scaledNow() const noexcept;
     RingView ownRing() const noexcept;
     EarSpectra accumulators() const noexcept { return {accumL, accumR}; }
-    void takeInput(std::uint64_t block) noexcept;
+    bool takeInput(std::uint64_t block) noexcept;
     std::uint64_t blockNumber() const noexcept;
-    void advanceFarTail() noexcept;
+    void advanceFarTail(bool silent) noexcept;
     bool canSum(const RingView& ring, bool compensated) const noexcept;
     void render(const RingView& ring, const RingView& other) noexcept;
     void renderSilence() noexcept;

@@ -3,8 +3,8 @@
 #include <cstring>
 
 #include "base/log.h"
+#include "base/silence.h"
 #include "convolution/conv_class.h"
-#include "convolution/sample_scan.h"
 
 namespace tessaly {
 
@@ -131,7 +131,7 @@ void convClass::transformChanged() noexcept {
 
 /// The far tail is built from what the spectra were made of: a copy where there is one of all
 /// samples, the response itself where its writer tells of each change.
-void convClass::advanceFarTail() noexcept {
+void convClass::advanceFarTail(bool silent) noexcept {
     if (far_ == nullptr) {
         return;
     }
@@ -142,7 +142,7 @@ void convClass::advanceFarTail() noexcept {
     if (!copied && notes_ != nullptr && !notes_->written.empty() && notes_->written.end > near) {
         far_->responseChanged();  // written, but not taken yet
     }
-    far_->advance(input, left, right);
+    far_->advance(input, silent, left, right);
 }
 
 /// Compensation of the whole response at once. Its handles are never created, so every transform

@@ -6,7 +6,7 @@
 #include <cstring>
 
 #include "base/ess_error.h"
-#include "convolution/sample_scan.h"
+#include "base/silence.h"
 #include "convolution/simd/kernels.h"
 #include "convolution/spectrum_stride.h"
 
@@ -105,6 +105,7 @@ void FarTail::clear() noexcept {
     std::fill(silentInputs_.begin(), silentInputs_.end(), std::uint8_t{1});
     std::fill(silentBlocks_.begin(), silentBlocks_.end(), std::uint8_t{1});
     untrusted_ = 0;
+    silentRun_ = 0;
     computing_ = false;
     resultStands_ = false;
 }
@@ -127,10 +128,19 @@ bool FarTail::continues(const float* window) const noexcept {
     return std::memcmp(filling_.data() + phase * length, window, length * sizeof(float)) == 0;
 }
 
-void FarTail::advance(const float* window, const float* left, const float* right) noexcept {
+/// All that is kept of the input is zeros, and has been before this block.
+bool FarTail::zerosThroughout() const noexcept {
+    return silentRun_ > 4 * static_cast<std::uint64_t>(ratio_);
+}
+
+void FarTail::advance(const float* window,
+                      bool silent,
+                      const float* left,
+                      const float* right) noexcept {
     const auto length = static_cast<std::size_t>(blockLength_);
     const auto ratio = static_cast<std::size_t>(ratio_);
-    if (!continues(window)) {
+    silentRun_ = silent ? silentRun_ + 1 : 0;
+    if (!zerosThroughout() && !continues(window)) {
         untrusted_ = static_cast<std::int64_t>(silentBlocks_.size() + 3 * ratio);
     } else if (untrusted_ > 0) {
         --untrusted_;
@@ -139,10 +149,12 @@ void FarTail::advance(const float* window, const float* left, const float* right
     if (phase == 0) {
         startRound();
     }
-    std::memcpy(filling_.data() + static_cast<std::size_t>(phase) * length, window + length,
-                length * sizeof(float));
+    if (!zerosThroughout()) {
+        std::memcpy(filling_.data() + static_cast<std::size_t>(phase) * length, window + length,
+                    length * sizeof(float));
+    }
     ++blocks_;
-    silentBlocks_[blocks_ % silentBlocks_.size()] = allZero(window, 2 * length) ? 1 : 0;
+    silentBlocks_[blocks_ % silentBlocks_.size()] = silent ? 1 : 0;
     if (built_ < ears * parts_) {
         buildNext(left, right);
     } else if (computing_ && phase > 0) {
@@ -161,10 +173,12 @@ void FarTail::startRound() noexcept {
     resultStands_ = computing_;
     resultSilent_ = nextSilent_;
 
-    std::memcpy(window_.data(), window_.data() + length_, length_ * sizeof(float));
-    std::memcpy(window_.data() + length_, filling_.data(), length_ * sizeof(float));
+    if (!zerosThroughout()) {
+        std::memcpy(window_.data(), window_.data() + length_, length_ * sizeof(float));
+        std::memcpy(window_.data() + length_, filling_.data(), length_ * sizeof(float));
+    }
     newest_ = newest_ + 1 == parts_ ? 0 : newest_ + 1;
-    const bool silent = allZero(window_.data(), 2 * length_);
+    const bool silent = zerosThroughout() || allZero(window_.data(), 2 * length_);
     silentInputs_[newest_] = silent ? 1 : 0;
     if (!silent) {
         FFT(window_.data(), memory_[inputMemory] + newest_ * stride_, transform_);

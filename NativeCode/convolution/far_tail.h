@@ -50,8 +50,9 @@ public:
     void clear() noexcept;
     /// Takes a block and does its share of the work. Block time.
     /// @param window  2B samples, the last block's and the new ones
+    /// @param silent  the window is known to be zeros
     /// @param left, right  the response, `partitions` * B samples each, without the gain of its end
-    void advance(const float* window, const float* left, const float* right) noexcept;
+    void advance(const float* window, bool silent, const float* left, const float* right) noexcept;
     /// Samples of the far part are not those of the block before. Block time.
     void responseChanged() noexcept;
 
@@ -70,6 +71,7 @@ private:
 
     bool allocate(std::size_t partitions);
     bool continues(const float* window) const noexcept;
+    bool zerosThroughout() const noexcept;
     void startRound() noexcept;
     void buildNext(const float* left, const float* right) noexcept;
     void sumShare(std::int32_t phase) noexcept;
@@ -84,7 +86,8 @@ private:
     std::size_t stride_ = 0;       ///< bins from one spectrum to the next
 
     std::uint64_t blocks_ = 0;
-    std::int64_t untrusted_ = 0;  ///< blocks until all input that counts came without a gap
+    std::uint64_t silentRun_ = 0;  ///< newest blocks whose windows are zeros
+    std::int64_t untrusted_ = 0;   ///< blocks until all input that counts came without a gap
     std::vector<std::uint8_t> silentBlocks_;      ///< by block modulo its size
     AlignedArray<float> window_;                  ///< the last two whole L
     AlignedArray<float> filling_;                 ///< the present L

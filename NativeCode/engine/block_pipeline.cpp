@@ -79,14 +79,39 @@ void directionStage(EngineState& state) noexcept {
     }
 }
 
+bool isCrossfadeBlock(const EngineState& state) noexcept {
+    return state.switches.fading && filterChangeAll && blockCounter != 0;
+}
+
+/// Neither this block's window nor the ring it is convolved with holds a sound, and has not for a
+/// while: waking from a response that was put off costs more than a usual block.
+bool watchSilence(EngineState& state) noexcept {
+    constexpr std::uint32_t patience = 16;  // blocks
+    const convClass& heard = isCrossfadeBlock(state) ? *state.secondOLS : *state.firstOLS;
+    const bool silent =
+        state.frontEnd.seesSilence(state.inBlock, state.inputChannel, state.controls.bassBoost,
+                                   state.switches.doppler) &&
+        heard.pastSilent() && essError == essErrorNone;
+    state.silentBlocks = silent ? std::min(state.silentBlocks + 1, patience + 1) : 0;
+    return state.silentBlocks > patience;
+}
+
+CompositionInputs compositionInputs(EngineState& state) noexcept {
+    return {state.switches,    state.sizes,
+            state.sampleRate,  state.direction,
+            state.law,         *state.mixParameters,
+            state.controls,    state.database->staticFilter,
+            filterChangeAll,   forceUpdateAll,
+            blockCounter,      state.frontEnd,
+            state.reflections, state.tail};
+}
+
 void composeResponse(EngineState& state) noexcept {
-    CompositionInputs inputs{state.switches,    state.sizes,
-                             state.sampleRate,  state.direction,
-                             state.law,         *state.mixParameters,
-                             state.controls,    state.database->staticFilter,
-                             filterChangeAll,   forceUpdateAll,
-                             blockCounter,      state.frontEnd,
-                             state.reflections, state.tail};
+    CompositionInputs inputs = compositionInputs(state);
+    inputs.unheard = watchSilence(state);
+    if (!inputs.unheard) {
+        catchUpWithResponse(state);
+    }
     state.composer.refreshFilter(inputs, state.interpolation);
 }
 
@@ -103,7 +128,7 @@ void convolve(EngineState& state) {
         logOutput("Tessaly_e ERROR: no comProcessing due to essError: ", essError);
         return;
     }
-    if (state.switches.fading && filterChangeAll && blockCounter != 0) {
+    if (isCrossfadeBlock(state)) {
         state.output.secondOLSactive = true;
         state.firstOLS->processCrossfade(*state.secondOLS, OutputStage::crossfadeLength);
     } else {
@@ -125,10 +150,17 @@ void printDebugDump(const EngineState& state) {
 
 void outputStage(EngineState& state) {
     OutputStage& output = state.output;
-    if (state.switches.fading && output.secondOLSactive) {
+    // The second one's result is then silent too.
+    const bool silent = state.firstOLS->resultSilent() && essError == essErrorNone;
+    if (state.switches.fading && output.secondOLSactive && !silent) {
         output.crossfade();
     }
-    output.write(state.outBlock, state.ambience, state.switches.atmoSelect, blockCounter);
+    if (silent && output.keepsSilence(state.switches.atmoSelect)) {
+        std::fill_n(state.outBlock, std::size_t{2} * static_cast<std::size_t>(output.blockLength()),
+                    0.0f);
+    } else {
+        output.write(state.outBlock, state.ambience, state.switches.atmoSelect, blockCounter);
+    }
     if (state.settings.debugDump != 0) {
         printDebugDump(state);
     }
@@ -147,6 +179,13 @@ void renderNothing(const EngineState& state, float* output) {
 }
 
 }  // namespace
+
+void catchUpWithResponse(EngineState& state) noexcept {
+    CompositionInputs inputs = compositionInputs(state);
+    if (state.composer.catchUp(inputs)) {
+        state.firstOLS->takeResponses();
+    }
+}
 
 void processEngineBlock(EngineState& state, float*& input, float*& output) {
     if (input == nullptr) {

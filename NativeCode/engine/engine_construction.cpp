@@ -351,6 +351,9 @@ SpatialEngine::~SpatialEngine() {
 int SpatialEngine::Stop() {
     logOutput(stopLine);
     EngineState& state = *state_;
+    if (state.complete) {
+        catchUpWithResponse(state);  // the convolver's spectra outlast this
+    }
     state.frontEnd.inputHistoryBuffer.clear();
     state.composer.filterLeftBuffer.clear();
     state.composer.filterRightBuffer.clear();

@@ -52,6 +52,7 @@ struct EngineState {
     float* inBlock = nullptr;
     float* outBlock = nullptr;
     std::int16_t inputChannel = 0;
+    std::uint32_t silentBlocks = 0;  ///< in a row, of input and rings; stops counting soon
 
     SourceDirection direction;
     DistanceLaw law;
@@ -78,6 +79,10 @@ struct EngineState {
 
 /// Builds everything in order; returns early, incomplete, on a fatal condition. Load time.
 void constructEngine(EngineState& state);
+
+/// Gives the convolver the response that was composed last, if nobody has heard it so far. Block
+/// time.
+void catchUpWithResponse(EngineState& state) noexcept TESSALY_NONBLOCKING;
 
 /// One block, in order. Block time.
 void processEngineBlock(EngineState& state, float*& input, float*& output) TESSALY_NONBLOCKING;

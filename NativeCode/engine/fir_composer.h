@@ -63,6 +63,8 @@ public:
     /// again, and before the responses are read by others. Block time.
     /// @return whether there was anything
     bool catchUp(CompositionInputs& inputs) noexcept TESSALY_NONBLOCKING;
+    /// There is a composition that has not been written.
+    bool isBehind() const noexcept { return postponed_; }
     /// The responses were written by somebody else: the next composition starts from nothing.
     /// Block time.
     void forget() noexcept;
@@ -99,14 +101,15 @@ private:
                     int end,
                     FrameRange changed) noexcept;
 
-    Ingredients wanted_;            ///< of the newest composition
-    Ingredients standing_;          ///< of the responses as they stand
-    PieceWriter writer_;            ///< for the engine's responses
-    PieceWriter plainWriter_;       ///< keeps nothing
-    std::uint32_t lastTables_ = 0;  ///< version of the HRIR tables
-    bool startKnown_ = false;       ///< up to the scaled end: what the last ingredients make
-    bool endKnown_ = false;         ///< from there on
-    bool postponed_ = false;        ///< the responses are behind `wanted_`
+    Ingredients wanted_;              ///< of the newest composition
+    Ingredients standing_;            ///< of the responses as they stand
+    PieceWriter writer_;              ///< for the engine's responses
+    PieceWriter plainWriter_;         ///< keeps nothing
+    std::uint32_t listedTables_ = 0;  ///< version of the HRIR tables behind `wanted_`
+    std::uint32_t lastTables_ = 0;    ///< and behind what stands
+    bool startKnown_ = false;         ///< up to the scaled end: what the last ingredients make
+    bool endKnown_ = false;           ///< from there on
+    bool postponed_ = false;          ///< the responses are behind `wanted_`
 };
 
 }  // namespace tessaly

@@ -11,7 +11,7 @@
 
 #include "base/log.h"
 #include "base/precision.h"
-#include "convolution/sample_scan.h"
+#include "base/silence.h"
 
 namespace tessaly {
 
@@ -101,6 +101,20 @@ private:
     std::size_t count_ = 0;
 };
 
+/// In this order: it can be heard while the distance moves both cut-offs.
+FilterChain chainOf(InputFrontEnd& frontEnd, bool bassBoost) noexcept {
+    FilterChain chain;
+    if (bassBoost) {
+        chain.add(frontEnd.bassShelveFilter);
+    }
+    if (frontEnd.inputLowPassLevel > 0.0f) {
+        chain.add(frontEnd.inputLowPass);
+    }
+    chain.add(frontEnd.highCutFilter);
+    chain.add(frontEnd.lowCutFilter);
+    return chain;
+}
+
 }  // namespace
 
 void InputFrontEnd::prepareFilters(int sampleRate) {
@@ -120,6 +134,19 @@ void InputFrontEnd::prepareWindow(int blocklenght) {
     silentBlocks_ = 0;
 }
 
+bool InputFrontEnd::staysAtRest(const float* channel, bool bassBoost, bool dopplerOn) noexcept {
+    return !dopplerOn && chainOf(*this, bassBoost).isAtRest() && isSilent(channel, blocklenght_);
+}
+
+bool InputFrontEnd::seesSilence(const float* input,
+                                int inputChannel,
+                                bool bassBoost,
+                                bool dopplerOn) noexcept {
+    const bool silence = staysAtRest(input + inputChannel, bassBoost, dopplerOn);
+    ahead_ = silence ? Ahead::Silence : Ahead::Sound;
+    return silence && silentBlocks_ > 0;
+}
+
 void InputFrontEnd::process(const float* input,
                             int inputChannel,
                             bool bassBoost,
@@ -134,18 +161,11 @@ void InputFrontEnd::process(const float* input,
     const float* const channel = input + inputChannel;
     inputGain = 1.0f;
 
-    FilterChain chain;
-    if (bassBoost) {
-        chain.add(bassShelveFilter);
-    }
-    if (inputLowPassLevel > 0.0f) {
-        chain.add(inputLowPass);
-    }
-    // In this order: it can be heard while the distance moves both cut-offs.
-    chain.add(highCutFilter);
-    chain.add(lowCutFilter);
-
-    if (!dopplerOn && chain.isAtRest() && isSilent(channel, B)) {
+    FilterChain chain = chainOf(*this, bassBoost);
+    const bool silence = ahead_ == Ahead::Unknown ? staysAtRest(channel, bassBoost, dopplerOn)
+                                                  : ahead_ == Ahead::Silence;
+    ahead_ = Ahead::Unknown;
+    if (silence) {
         chain.clear();
         keepSilence();
         return;

@@ -1,6 +1,8 @@
 // The input side of a block: delay line and filters into the convolver's sliding window.
 #pragma once
 
+#include <cstdint>
+
 #include "base/aligned_array.h"
 #include "base/audio_thread.h"
 #include "convolution/simd/kernels.h"
@@ -15,6 +17,13 @@ public:
     void prepareFilters(int sampleRate);
     /// Load time: allocates the window of 2 * `blocklenght` floats.
     void prepareWindow(int blocklenght);
+
+    /// Whether the next call of `process`, with the same arguments, leaves nothing but zeros in the
+    /// window. Only redesigns of the distance filters may come between. Block time.
+    bool seesSilence(const float* input,
+                     int inputChannel,
+                     bool bassBoost,
+                     bool dopplerOn) noexcept TESSALY_NONBLOCKING;
 
     /// One block of input into the upper half of `inputHistory`. Silence through filters that have
     /// come to rest is not computed. Block time.
@@ -49,10 +58,14 @@ public:
     DopplerLine doppler;
 
 private:
+    bool staysAtRest(const float* channel, bool bassBoost, bool dopplerOn) noexcept;
     void keepSilence() noexcept;
 
     const SignalKernels* kernels_ = selectKernels().signal;
     int silentBlocks_ = 0;  ///< newest blocks in the window that are zero throughout, 2 at most
+    /// What `seesSilence` found in the block that `process` has not taken yet.
+    enum class Ahead : std::uint8_t { Unknown, Silence, Sound };
+    Ahead ahead_ = Ahead::Unknown;
     int sampleRate_ = 0;
     int blocklenght_ = 0;
 };

@@ -1,6 +1,8 @@
 // Mixes a block out: crossfade after a change of response, normalisation, ambience.
 #pragma once
 
+#include <cmath>
+
 #include "base/aligned_array.h"
 #include "base/audio_thread.h"
 #include "convolution/simd/kernels.h"
@@ -32,6 +34,13 @@ public:
                const Ambience& ambience,
                int atmoSelect,
                unsigned int block) const noexcept TESSALY_NONBLOCKING;
+
+    /// A silent result stays silent on its way out: there is no ambience, and the scale is finite.
+    /// Block time.
+    bool keepsSilence(int atmoSelect) const noexcept TESSALY_NONBLOCKING {
+        return atmoSelect == 0 && std::isfinite(1.0f / outputNormalisation);
+    }
+    int blockLength() const noexcept { return blocklenght_; }
 
     AlignedArray<float> firstOutLeftBuffer;
     AlignedArray<float> firstOutRightBuffer;
