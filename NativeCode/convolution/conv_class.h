@@ -203,6 +203,7 @@ private:
     void borrowAndProcess(convClass& second) noexcept;
     bool sharesWith(const convClass& second) noexcept;
     void findChangedPartitions() noexcept;
+    void findChangedPartitions(std::size_t first, std::size_t end) noexcept;
     void transformChanged() noexcept;
     void keepTimeParts(std::size_t partitions);
 

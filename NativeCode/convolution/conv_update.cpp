@@ -47,29 +47,37 @@ void convClass::findChangedPartitions() noexcept {
     std::fill(changed_.begin(), changed_.end(), std::uint8_t{0});
     changedCount_ = 0;
     changedTaps_ = 0;
-    const auto length = static_cast<std::size_t>(blockLength);
-    std::size_t first = 0;
-    std::size_t end = changed_.size();
-    if (notes_ != nullptr) {
-        FirStretch& written = notes_->written;
-        if (written.empty()) {
-            return;
-        }
-        first = static_cast<std::size_t>(std::max(written.begin, 0)) / length;
-        end = std::min(end, (static_cast<std::size_t>(written.end) + length - 1) / length);
-        noteStartChange(written.end);
-        written.clear();
+    if (notes_ == nullptr) {
+        findChangedPartitions(0, changed_.size());
+        return;
     }
+    const auto length = static_cast<std::size_t>(blockLength);
+    for (const FirStretch& written : notes_->written) {
+        findChangedPartitions(
+            static_cast<std::size_t>(std::max(written.begin, 0)) / length,
+            (static_cast<std::size_t>(std::max(written.end, 0)) + length - 1) / length);
+    }
+    if (!notes_->written.empty()) {
+        noteStartChange(notes_->written.hull().end);
+        notes_->written.clear();
+    }
+}
+
+void convClass::findChangedPartitions(std::size_t first, std::size_t end) noexcept {
+    const auto length = static_cast<std::size_t>(blockLength);
     const ScaledPartitions next = scaledNow();
     const auto available = static_cast<std::size_t>(std::max(firBufferSize, 0));
     const auto differs = [length](const float* kept, const float* fir, std::size_t start) {
         return fir != nullptr &&
                (kept == nullptr || std::memcmp(kept, fir + start, length * sizeof(float)) != 0);
     };
-    for (std::size_t i = first; i < end; ++i) {
+    for (std::size_t i = first; i < std::min(end, changed_.size()); ++i) {
         const std::size_t start = i * length;
         if (start + length > available) {
             break;
+        }
+        if (changed_[i] != 0) {
+            continue;
         }
         // One that joins or leaves the scaled end counts differently even with equal samples.
         if (differs(timePartsL[i], firL, start) || differs(timePartsR[i], firR, start) ||
@@ -139,7 +147,7 @@ void convClass::advanceFarTail(bool silent) noexcept {
     const float* const left = copied ? timeMemoryL_.data() : firL;
     const float* const right = copied ? timeMemoryR_.data() : firR;
     const auto near = static_cast<std::int32_t>(far_->firstPartition()) * blockLength;
-    if (!copied && notes_ != nullptr && !notes_->written.empty() && notes_->written.end > near) {
+    if (!copied && notes_ != nullptr && notes_->written.hull().end > near) {
         far_->responseChanged();  // written, but not taken yet
     }
     far_->advance(input, silent, left, right);

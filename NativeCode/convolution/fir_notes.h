@@ -2,6 +2,8 @@
 #pragma once
 
 #include <algorithm>
+#include <array>
+#include <cstddef>
 
 namespace tessaly {
 
@@ -22,6 +24,54 @@ struct FirStretch {
     }
 };
 
+/// Stretches of an impulse response, apart from each other, in no order.
+class FirStretches {
+public:
+    static constexpr std::size_t capacity = 64;
+
+    bool empty() const noexcept { return count_ == 0; }
+    void clear() noexcept { count_ = 0; }
+    const FirStretch* begin() const noexcept { return stretches_.data(); }
+    const FirStretch* end() const noexcept { return stretches_.data() + count_; }
+    /// Holds [from, to) too from now on. What touches becomes one; beyond the capacity the last
+    /// one grows over what lies between.
+    void include(int from, int to) noexcept {
+        if (from >= to) {
+            return;
+        }
+        FirStretch added{from, to};
+        for (std::size_t k = 0; k < count_;) {
+            const FirStretch& other = stretches_[k];
+            if (other.begin <= added.end && added.begin <= other.end) {
+                added.include(other.begin, other.end);
+                stretches_[k] = stretches_[--count_];
+                k = 0;
+            } else {
+                ++k;
+            }
+        }
+        if (count_ == capacity) {
+            const FirStretch last = stretches_[--count_];
+            added.include(last.begin, last.end);
+            include(added.begin, added.end);
+            return;
+        }
+        stretches_[count_++] = added;
+    }
+    /// From the first sample to the last one.
+    FirStretch hull() const noexcept {
+        FirStretch all;
+        for (const FirStretch& stretch : *this) {
+            all.include(stretch.begin, stretch.end);
+        }
+        return all;
+    }
+
+private:
+    std::array<FirStretch, capacity> stretches_{};
+    std::size_t count_ = 0;
+};
+
 /// The end of a response that stands in the buffers without its gain: its level may change without
 /// a sample being written. Starts at a whole partition.
 struct ScaledEnd {
@@ -31,8 +81,8 @@ struct ScaledEnd {
 
 /// What a convolver is told about a response beside its samples.
 struct FirNotes {
-    FirStretch written;   ///< since the convolver last took it
-    ScaledEnd scaledEnd;  ///< as of now
+    FirStretches written;  ///< since the convolver last took them
+    ScaledEnd scaledEnd;   ///< as of now
 };
 
 }  // namespace tessaly

@@ -210,13 +210,16 @@ void FirComposer::composeFIR(float* left, float* right, CompositionInputs& input
 void FirComposer::writeWhole(const EarBuffers& ears,
                              CompositionInputs& inputs,
                              int piecesEnd,
-                             FrameRange changed) noexcept {
+                             const FirStretches& changed) noexcept {
     // Without a tail there are zeros behind the pieces.
     clearFrames(ears, hasTail(inputs) ? ears.size : piecesEnd);
     writer_.write(ears, wanted_.pieces, inputs.sampleRate, inputs.reflections.reflectionFilter);
     addTails(ears, inputs, wanted_.tailCutOff, wanted_.roomSizeFactor, wanted_.tailGain);
     fadeFilterTail(inputs.sizes.FIR_size);
-    notes.written.include(changed.begin, changed.end);
+    for (const FirStretch& stretch : changed) {
+        notes.written.include(std::clamp(stretch.begin, 0, ears.size),
+                              std::clamp(stretch.end, 0, ears.size));
+    }
     notes.scaledEnd = {ears.size, 1.0f};
 }
 
@@ -230,16 +233,32 @@ void FirComposer::writeEnd(const EarBuffers& ears, CompositionInputs& inputs) no
 }
 
 /// Direct sound, reflections and the start of the tail with its gain, up to `end`.
-void FirComposer::writeStart(const EarBuffers& ears,
-                             CompositionInputs& inputs,
-                             int end,
-                             FrameRange changed) noexcept {
+void FirComposer::writeStart(const EarBuffers& ears, CompositionInputs& inputs, int end) noexcept {
     clearFrames(ears, end);
     writer_.write(ears, wanted_.pieces, inputs.sampleRate, inputs.reflections.reflectionFilter);
-    inputs.tail.addStart(ears.left, ears.right, end, wanted_.tailCutOff, wanted_.tailGain);
+    inputs.tail.addStart(ears.left, ears.right, 0, end, wanted_.tailCutOff, wanted_.tailGain);
     inputs.tail.cutToRoomSize(ears.left, ears.right, end, wanted_.roomSizeFactor);
     fadeFilterTail(inputs.sizes.FIR_size, end);
-    notes.written.include(changed.begin, changed.end);
+    notes.written.include(0, end);
+}
+
+/// Of the start only the frames that pieces have left or come to, in a room of full size.
+void FirComposer::writeStretches(const EarBuffers& ears,
+                                 CompositionInputs& inputs,
+                                 int end,
+                                 const FirStretches& changed) noexcept {
+    std::array<Biquad, 2>& filters = inputs.reflections.reflectionFilter;
+    writer_.refresh(wanted_.pieces, inputs.sampleRate, filters);
+    for (const FirStretch& stretch : changed) {
+        const int first = std::clamp(stretch.begin, 0, end);
+        const int last = std::clamp(stretch.end, 0, end);
+        const EarBuffers part{ears.left + first, ears.right + first, last - first};
+        clearFrames(part, part.size);
+        writer_.writeFrames(part, first, wanted_.pieces, inputs.sampleRate, filters);
+        inputs.tail.addStart(part.left, part.right, first, last, wanted_.tailCutOff,
+                             wanted_.tailGain);
+        notes.written.include(first, last);
+    }
 }
 
 /// The engine's own responses: what composeFIR and fadeFilterTail give. While nobody hears them
@@ -282,13 +301,12 @@ void FirComposer::writeChanges(CompositionInputs& inputs) noexcept {
     }
     const PieceList& pieces = wanted_.pieces;
     const bool samePieces = startKnown_ && pieces == standing_.pieces;
-    const FrameRange everything{0, ears.size};
+    FirStretches everything;
+    everything.include(0, ears.size);
     const int extent = pieces.extent();
     const int lastEnd = std::max(extent, standing_.pieces.extent());
     const int piecesEnd = startKnown_ && !endKnown_ ? std::clamp(lastEnd, 0, ears.size) : ears.size;
-    const FrameRange differences = pieces.differencesTo(standing_.pieces);
-    const FrameRange changedPieces{std::clamp(differences.begin, 0, ears.size),
-                                   std::clamp(differences.end, 0, ears.size)};
+    const FirStretches differences = pieces.differencesTo(standing_.pieces);
     const bool sameTail = sameBits(wanted_.tailCutOff, standing_.tailCutOff) &&
                           sameBits(wanted_.roomSizeFactor, standing_.roomSizeFactor);
     const bool sameGain = sameBits(wanted_.tailGain, standing_.tailGain);
@@ -311,7 +329,7 @@ void FirComposer::writeChanges(CompositionInputs& inputs) noexcept {
         const bool sameEnd = !hasTail(inputs) || (sameTail && sameGain && !synthetic);
         if (endKnown_ || !samePieces || !sameEnd) {
             writeWhole(ears, inputs, piecesEnd,
-                       startKnown_ && !endKnown_ && sameEnd ? changedPieces : everything);
+                       startKnown_ && !endKnown_ && sameEnd ? differences : everything);
         }
         startKnown_ = true;
         endKnown_ = false;
@@ -323,9 +341,14 @@ void FirComposer::writeChanges(CompositionInputs& inputs) noexcept {
         endKnown_ = true;
     }
     if (!sameEnd || !samePieces || !sameGain || begin != notes.scaledEnd.begin) {
-        const bool sameFrames =
-            sameEnd && sameGain && startKnown_ && begin == notes.scaledEnd.begin;
-        writeStart(ears, inputs, begin, sameFrames ? changedPieces : FrameRange{0, begin});
+        // The cut to the room's size and the fade at its end count frames from the start.
+        const bool plainStart =
+            !(wanted_.roomSizeFactor < 1.0f) && begin <= inputs.sizes.FIR_size - tailFadeFrames;
+        if (sameEnd && sameGain && startKnown_ && begin == notes.scaledEnd.begin && plainStart) {
+            writeStretches(ears, inputs, begin, differences);
+        } else {
+            writeStart(ears, inputs, begin);
+        }
         startKnown_ = true;
         notes.scaledEnd = {begin, wanted_.tailGain};
     }

@@ -94,12 +94,13 @@ private:
     void writeWhole(const EarBuffers& ears,
                     CompositionInputs& inputs,
                     int piecesEnd,
-                    FrameRange changed) noexcept;
+                    const FirStretches& changed) noexcept;
     void writeEnd(const EarBuffers& ears, CompositionInputs& inputs) noexcept;
-    void writeStart(const EarBuffers& ears,
-                    CompositionInputs& inputs,
-                    int end,
-                    FrameRange changed) noexcept;
+    void writeStart(const EarBuffers& ears, CompositionInputs& inputs, int end) noexcept;
+    void writeStretches(const EarBuffers& ears,
+                        CompositionInputs& inputs,
+                        int end,
+                        const FirStretches& changed) noexcept;
 
     Ingredients wanted_;              ///< of the newest composition
     Ingredients standing_;            ///< of the responses as they stand

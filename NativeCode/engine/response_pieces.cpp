@@ -80,15 +80,10 @@ bool PieceList::operator==(const PieceList& other) const noexcept {
     return count_ == other.count_ && std::equal(begin(), end(), other.begin());
 }
 
-FrameRange PieceList::differencesTo(const PieceList& other) const noexcept {
-    FrameRange range{0, 0};
-    const auto include = [&range](const ResponsePiece& piece) noexcept {
-        const int end = piece.position + piece.frames;
-        if (range.begin >= range.end) {
-            range = {piece.position, end};
-        } else {
-            range = {std::min(range.begin, piece.position), std::max(range.end, end)};
-        }
+FirStretches PieceList::differencesTo(const PieceList& other) const noexcept {
+    FirStretches differences;
+    const auto include = [&differences](const ResponsePiece& piece) noexcept {
+        differences.include(piece.position, piece.position + piece.frames);
     };
     for (int k = 0; k < std::max(count_, other.count_); ++k) {
         const auto at = static_cast<std::size_t>(k);
@@ -102,7 +97,7 @@ FrameRange PieceList::differencesTo(const PieceList& other) const noexcept {
             include(other.pieces_[at]);
         }
     }
-    return range;
+    return differences;
 }
 
 void PieceWriter::prepare(int hrirLength) {
@@ -119,8 +114,23 @@ void PieceWriter::write(const EarBuffers& ears,
                         int sampleRate,
                         std::array<Biquad, 2>& filters) noexcept {
     refresh(pieces, sampleRate, filters);
+    writeFrames(ears, 0, pieces, sampleRate, filters);
+}
+
+void PieceWriter::writeFrames(const EarBuffers& ears,
+                              int first,
+                              const PieceList& pieces,
+                              int sampleRate,
+                              std::array<Biquad, 2>& filters) noexcept {
     std::size_t slot = 0;
-    for (const ResponsePiece& piece : pieces) {
+    for (const ResponsePiece& whole : pieces) {
+        const FrameRange inside = framesInside(whole.position - first, whole.frames, ears.size);
+        if (inside.begin >= inside.end) {
+            ++slot;
+            continue;
+        }
+        ResponsePiece piece = whole;
+        piece.position -= first;
         switch (piece.kind) {
             case ResponsePiece::Kind::Direct:
                 writeDirect(*kernels_, ears, piece);

@@ -6,6 +6,7 @@
 
 #include "base/aligned_array.h"
 #include "base/audio_thread.h"
+#include "convolution/fir_notes.h"
 #include "convolution/simd/kernels.h"
 #include "engine/ear_mix.h"
 #include "engine/reflections.h"
@@ -54,7 +55,7 @@ public:
     int extent() const noexcept;
     bool operator==(const PieceList& other) const noexcept;
     /// Frames that any piece touches that the other list has not in the same place.
-    FrameRange differencesTo(const PieceList& other) const noexcept;
+    FirStretches differencesTo(const PieceList& other) const noexcept;
 
 private:
     std::array<ResponsePiece, capacity> pieces_{};
@@ -76,6 +77,18 @@ public:
                const PieceList& pieces,
                int sampleRate,
                std::array<Biquad, 2>& filters) noexcept TESSALY_NONBLOCKING;
+    /// Filters what is not kept as it is wanted. Block time.
+    void refresh(const PieceList& pieces,
+                 int sampleRate,
+                 std::array<Biquad, 2>& filters) noexcept TESSALY_NONBLOCKING;
+    /// Of refreshed pieces what falls into some frames of the response. Block time.
+    /// @param ears   those frames, cleared
+    /// @param first  the first of them
+    void writeFrames(const EarBuffers& ears,
+                     int first,
+                     const PieceList& pieces,
+                     int sampleRate,
+                     std::array<Biquad, 2>& filters) noexcept TESSALY_NONBLOCKING;
 
 private:
     /// What decides the samples that are kept; no HRIR: none are.
@@ -93,7 +106,6 @@ private:
         return samples_.data() + 2 * slot * static_cast<std::size_t>(framesKept_);
     }
     static Biquad& filterOf(const ResponsePiece& piece, std::array<Biquad, 2>& filters) noexcept;
-    void refresh(const PieceList& pieces, int sampleRate, std::array<Biquad, 2>& filters) noexcept;
 
     const SignalKernels* kernels_ = selectKernels().signal;
     std::array<Kept, PieceList::capacity> kept_{};

@@ -109,20 +109,20 @@ void ReverbTail::refreshStart(float reverbLP_Fc, int sampleRate) noexcept {
 }
 
 void ReverbTail::addStart(
-    float* left, float* right, int frames, float reverbLP_Fc, float gain) const noexcept {
+    float* left, float* right, int begin, int end, float reverbLP_Fc, float gain) const noexcept {
     if (!filtered(reverbLP_Fc)) {
-        const int stored = static_cast<int>(reverbIR.size() / 2);
-        if (stored > 0) {
-            const float* const tail = reverbIR.data();
-            addPairs({left, right, std::min(frames, stored)}, 0, {tail, tail + 1, reverbLength},
-                     gain);
+        const int stored = std::min(static_cast<int>(reverbIR.size() / 2), reverbLength);
+        const int last = std::min(end, stored);
+        if (begin < last) {
+            kernels_->addPairs(static_cast<std::size_t>(last - begin),
+                               reverbIR.data() + std::ptrdiff_t{2} * begin, gain, left, right);
         }
         return;
     }
-    const int kept = std::min(frames, static_cast<int>(filteredLeft_.size()));
-    const float* const tailLeft = filteredLeft_.data();
-    const float* const tailRight = filteredRight_.data();
-    for (int i = 0; i < kept; ++i) {
+    const int last = std::min(end, static_cast<int>(filteredLeft_.size()));
+    const float* const tailLeft = filteredLeft_.data() + begin;
+    const float* const tailRight = filteredRight_.data() + begin;
+    for (int i = 0; i < last - begin; ++i) {
         left[i] += tailLeft[i] * gain;
         right[i] += tailRight[i] * gain;
     }

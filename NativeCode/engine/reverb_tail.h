@@ -6,6 +6,7 @@
 
 #include "base/aligned_array.h"
 #include "base/audio_thread.h"
+#include "convolution/simd/kernels.h"
 #include "engine/biquad.h"
 #include "resources/wav_reader.h"
 
@@ -33,13 +34,11 @@ public:
     int startFrames(float reverbLP_Fc) const noexcept;
     /// Filters the start anew. Block time.
     void refreshStart(float reverbLP_Fc, int sampleRate) noexcept TESSALY_NONBLOCKING;
-    /// Adds the first frames only, as `addTail` does. Block time.
-    /// @param frames  up to `startFrames`; the buffers hold as many
-    void addStart(float* left,
-                  float* right,
-                  int frames,
-                  float reverbLP_Fc,
-                  float gain) const noexcept TESSALY_NONBLOCKING;
+    /// Adds some of the first frames only, as `addTail` does. Block time.
+    /// @param left, right  frames from `begin` on
+    /// @param begin, end   up to `startFrames`
+    void addStart(float* left, float* right, int begin, int end, float reverbLP_Fc, float gain)
+        const noexcept TESSALY_NONBLOCKING;
     /// The synthetic tail of 26 sparse HRIRs. Block time.
     void addSyntheticTail(float* left,
                           float* right,
@@ -65,6 +64,7 @@ public:
     Biquad reverbLowPass;
 
 private:
+    const SignalKernels* kernels_ = selectKernels().signal;
     AlignedArray<float> filteredLeft_;   ///< the start through the low-pass, without a gain
     AlignedArray<float> filteredRight_;  ///< likewise
     bool filtered(float reverbLP_Fc) const noexcept;

@@ -114,7 +114,9 @@ protected:
         standing.resize(static_cast<std::size_t>(sizes.firBufferSize));
         for (int i = 0; i < sizes.firBufferSize; ++i) {
             float& before = standing[static_cast<std::size_t>(i)];
-            const bool noted = i >= notes.written.begin && i < notes.written.end;
+            const bool noted = std::ranges::any_of(notes.written, [i](const FirStretch& stretch) {
+                return i >= stretch.begin && i < stretch.end;
+            });
             const bool moved = (i < standingEnd) != (i < notes.scaledEnd.begin);
             ASSERT_TRUE(noted || (before == now[i] && !moved)) << i;
             before = now[i];
@@ -129,7 +131,7 @@ protected:
     }
     /// What a convolver does with the notes.
     FirStretch take() {
-        const FirStretch written = composer.notes.written;
+        const FirStretch written = composer.notes.written.hull();
         composer.notes.written.clear();
         return written;
     }
