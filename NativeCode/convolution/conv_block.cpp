@@ -17,7 +17,7 @@ float* convClass::process() noexcept {
     }
     advanceFarTail(silent);
     const RingView ring = borrowed ? RingView{FDL, nullptr, newestSlot()} : ownRing();
-    render(ring, partner_ != nullptr ? partner_->ownRing() : ring);
+    render(ring, partner_ != nullptr ? partner_->ownRing() : ring, Extent::Window);
     return outputL;
 }
 
@@ -66,7 +66,7 @@ bool convClass::canSum(const RingView& ring, bool compensated) const noexcept {
 }
 
 /// One block from a ring with the spectra as they stand.
-void convClass::render(const RingView& ring, const RingView& other) noexcept {
+void convClass::render(const RingView& ring, const RingView& other, Extent extent) noexcept {
     const bool compensated = hpTFactive && FDLtoBUFConv == 1;
     farHeard_ = false;
     if (ring.state != nullptr && ring.state->silent() && ifftHandle != nullptr) {
@@ -75,33 +75,40 @@ void convClass::render(const RingView& ring, const RingView& other) noexcept {
     }
     resultSilent_ = false;
     const bool complete = canSum(ring, compensated);
-    clearSpectrum(accumL, binCount - 1);
-    clearSpectrum(accumR, binCount - 1);
+    bool summed = false;
     if (complete && compensated) {
         sums_.begin();
         sums_.add(ring.spectra[0], hpTFspectrumL, hpTFspectrumR);
-        sums_.store(accumulators());
+        summed = sums_.store(accumulators());
     } else if (complete) {
         farHeard_ = findFarCorrections(ring, other, scaled_, scaled_);
         const Layout layout = layoutOf(scaled_);
         const auto all = [](std::size_t) { return true; };
         collect(ring, 0, layout.scaledBegin, all);
-        sums_.addTo(accumulators());
-        collect(ring, layout.scaledBegin, layout.end, all);
+        summed = sums_.store(accumulators());
+    }
+    if (!summed) {
+        clearSpectrum(accumL, binCount - 1);
+        clearSpectrum(accumR, binCount - 1);
+    }
+    if (complete && !compensated) {
+        const Layout layout = layoutOf(scaled_);
+        collect(ring, layout.scaledBegin, layout.end, [](std::size_t) { return true; });
         addFarHeld();
         sums_.addTo(accumulators(), layout.gain);
         subtractFarExpected(accumulators(), layout.gain);
     }
-    transformBack();
+    transformBack(extent);
     if (farHeard_) {
         far_->addTo(outputL + blockLength, outputR + blockLength, layoutOf(scaled_).gain,
                     blockLength);
     }
 }
 
-void convClass::transformBack() noexcept {
-    dftiStatus = IFFT(accumL, outputL, ifftHandle);
-    dftiStatus = IFFT(accumR, outputR, ifftHandle);
+void convClass::transformBack(Extent extent) noexcept {
+    const auto back = extent == Extent::Block ? blockIFFT : IFFT;
+    dftiStatus = back(accumL, outputL, ifftHandle);
+    dftiStatus = back(accumR, outputR, ifftHandle);
 }
 
 /// The results of a silent block are still there in the next one.
@@ -271,7 +278,7 @@ void convClass::processCrossfade(convClass& second, std::int32_t heardOfOld) noe
         changedCount_ = 0;
     }
     if (ring.state->silent() || (changedCount_ == 0 && before == scaled_)) {
-        render(ring, ownRing());
+        render(ring, ownRing(), Extent::Block);
         std::copy_n(outputL + blockLength, heard, second.outputL + blockLength);
         std::copy_n(outputR + blockLength, heard, second.outputR + blockLength);
         if (byTaps && !ring.state->silent()) {
@@ -337,7 +344,7 @@ void convClass::renderBoth(convClass& second,
     second.dftiStatus = middleIFFT(second.accumR, second.outputR, heard, second.ifftHandle);
     transformChanged();
     addOwn(now, accumulators());
-    transformBack();
+    transformBack(Extent::Block);
     if (farHeard_) {
         far_->addTo(second.outputL + blockLength, second.outputR + blockLength, old.gain, heard);
         far_->addTo(outputL + blockLength, outputR + blockLength, now.gain, blockLength);

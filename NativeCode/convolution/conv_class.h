@@ -97,8 +97,8 @@ public:
     /// its ring and renders with the spectra as they stand, then this one updates them and renders
     /// the same ring; its own ring stays as it is, newest slot included. The sum over partitions
     /// that no update touches is made once for both; without any, the second's result is a copy of
-    /// this one's. Of the second's block only the first `heardOfOld` samples are promised. Block
-    /// time.
+    /// this one's. Of the second's block only the first `heardOfOld` samples are promised, and of
+    /// both nothing before the block. Block time.
     void processCrossfade(convClass& second, std::int32_t heardOfOld) noexcept;
 
     /// Who writes the responses tells here which samples, taken and cleared by each update, and
@@ -227,12 +227,14 @@ private:
     std::uint64_t blockNumber() const noexcept;
     void advanceFarTail(bool silent) noexcept;
     bool canSum(const RingView& ring, bool compensated) const noexcept;
-    void render(const RingView& ring, const RingView& other) noexcept;
+    /// What of a result is made: all 2B samples, or those of the block.
+    enum class Extent : std::uint8_t { Window, Block };
+    void render(const RingView& ring, const RingView& other, Extent extent) noexcept;
     void renderSilence() noexcept;
     void renderOldByTaps(convClass& second, std::int32_t heard) noexcept;
     void noteStartChange(std::int32_t taps) noexcept;
     void renderBoth(convClass& second, const ScaledPartitions& before, std::int32_t heard) noexcept;
-    void transformBack() noexcept;
+    void transformBack(Extent extent) noexcept;
     /// Partitions [0, scaledBegin) of the uniform sums and [scaledBegin, end), which count `gain`
     /// times, as does the far tail behind them.
     struct Layout {

@@ -17,6 +17,11 @@
 namespace tessaly {
 namespace {
 
+/// Transforms up to this length work on the stack, which all sources of a thread share: memory of
+/// their own would be out of the nearest caches whenever they come round.
+constexpr std::int32_t stackLength = 2048;
+constexpr std::size_t stackFloats = transformWorkFloats(stackLength / 2);
+
 /// Takes one request from a count that tests may have limited.
 bool stillAllowed(std::int32_t& left) noexcept {
     if (left == 0) {
@@ -36,11 +41,11 @@ struct TransformPlan {
     explicit TransformPlan(std::int32_t length)
         : kernels(selectKernels()),
           tables(transformTables(length / 2, kernels.transformLanes(length / 2))),
-          work(transformWorkFloats(length / 2)) {}
+          work(length > stackLength ? transformWorkFloats(length / 2) : 0) {}
 
     const Kernels& kernels;
     const TransformTables* tables;
-    AlignedArray<float> work;
+    AlignedArray<float> work;  ///< of long transforms; short ones work on the stack
     bool committed = false;
 };
 
@@ -128,7 +133,12 @@ std::int32_t compute(const TransformHandle& handle,
     if (input == nullptr || output == nullptr) {
         return transformNullArray;
     }
-    transform(handle->kernels, *handle->tables, handle->work.data());
+    if (handle->work.empty()) {
+        alignas(AlignedArray<float>::alignment) float work[stackFloats];
+        transform(handle->kernels, *handle->tables, static_cast<float*>(work));
+    } else {
+        transform(handle->kernels, *handle->tables, handle->work.data());
+    }
     return transformOk;
 }
 
@@ -186,6 +196,21 @@ std::int32_t computeBackwardMiddle(const TransformHandle& handle,
         });
 }
 
+std::int32_t computeBackwardBlock(const TransformHandle& handle,
+                                  const ComplexBin* input,
+                                  float* output) noexcept {
+    return compute(handle, input, output,
+                   [&](const Kernels& kernels, const auto& tables, float* work) {
+                       if (tables.points > stackLength / 2) {
+                           kernels.backward(tables, input, output, work);
+                           return;
+                       }
+                       alignas(AlignedArray<float>::alignment) float scratch[stackFloats];
+                       kernels.backwardBlock(tables, input, output + tables.points, work,
+                                             static_cast<float*>(scratch));
+                   });
+}
+
 std::int32_t createFFT(TransformHandle& handle, std::int32_t length) noexcept {
     std::int32_t status = createTransform(handle, length);
     if (status != transformOk) {
@@ -219,6 +244,12 @@ std::int32_t halfFFT(const float* input,
 
 std::int32_t IFFT(const ComplexBin* input, float* output, const TransformHandle& handle) noexcept {
     return reportBackward(computeBackward(handle, input, output));
+}
+
+std::int32_t blockIFFT(const ComplexBin* input,
+                       float* output,
+                       const TransformHandle& handle) noexcept {
+    return reportBackward(computeBackwardBlock(handle, input, output));
 }
 
 std::int32_t middleIFFT(const ComplexBin* input,

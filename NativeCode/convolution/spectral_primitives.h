@@ -63,6 +63,11 @@ std::int32_t computeBackwardMiddle(const TransformHandle& handle,
                                    const ComplexBin* input,
                                    float* output,
                                    std::int32_t samples) noexcept TESSALY_NONBLOCKING;
+/// As computeBackward, of which samples B to 2B - 1 are wanted: of `output`, 2B floats, the others
+/// are undefined. Block time.
+std::int32_t computeBackwardBlock(const TransformHandle& handle,
+                                  const ComplexBin* input,
+                                  float* output) noexcept TESSALY_NONBLOCKING;
 
 /// Creates, sets and commits a plan for `length` real samples. A failing step writes a trace line
 /// and the next one runs all the same. Load time: allocates.
@@ -77,6 +82,10 @@ std::int32_t halfFFT(const float* input,
                      const TransformHandle& handle) noexcept;
 /// Backward transform; a refusal is a trace line and leaves `output` as it was. Block time.
 std::int32_t IFFT(const ComplexBin* input, float* output, const TransformHandle& handle) noexcept;
+/// Backward transform of which only samples B to 2B - 1 are wanted; likewise. Block time.
+std::int32_t blockIFFT(const ComplexBin* input,
+                       float* output,
+                       const TransformHandle& handle) noexcept;
 /// Backward transform of which only samples B to B + `samples` - 1 are wanted; likewise. Block
 /// time.
 std::int32_t middleIFFT(const ComplexBin* input,

@@ -239,6 +239,7 @@ TEST(KernelDispatch, EveryTableIsComplete) {
         EXPECT_NE(kernels->forwardHalf, nullptr);
         EXPECT_NE(kernels->backward, nullptr);
         EXPECT_NE(kernels->backwardMiddle, nullptr);
+        EXPECT_NE(kernels->backwardBlock, nullptr);
         EXPECT_NE(kernels->multiply, nullptr);
         EXPECT_NE(kernels->add, nullptr);
         EXPECT_NE(kernels->ringSum, nullptr);

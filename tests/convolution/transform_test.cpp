@@ -204,6 +204,22 @@ TEST_P(Transform, OfTheMiddleEqualsThatPartOfTheWholeOne) {
     }
 }
 
+TEST_P(Transform, OfTheBlockEqualsTheSecondHalfOfTheWholeOne) {
+    for (std::size_t length = 4; length <= 16384; length *= 2) {
+        SCOPED_TRACE(length);
+        const TransformHandle handle = plan(length);
+        const std::vector<ComplexBin> bins = Noise(5).bins(length / 2 + 1);
+        std::vector<float> expected(length);
+        std::vector<float> got(length + 1, 99.0f);
+        ASSERT_EQ(IFFT(bins.data(), expected.data(), handle), transformOk);
+        ASSERT_EQ(blockIFFT(bins.data(), got.data(), handle), transformOk);
+        for (std::size_t i = length / 2; i < length; ++i) {
+            ASSERT_EQ(got[i], expected[i]) << i;
+        }
+        EXPECT_EQ(got.back(), 99.0f);
+    }
+}
+
 TEST_P(Transform, OfAHalfAndOfTheMiddleAreRefusedAsTheWholeOnes) {
     std::vector<float> samples(16);
     std::vector<ComplexBin> bins(9);
@@ -212,6 +228,8 @@ TEST_P(Transform, OfAHalfAndOfTheMiddleAreRefusedAsTheWholeOnes) {
     const TransformHandle handle = plan(16);
     EXPECT_EQ(computeForwardHalf(handle, nullptr, bins.data()), transformNullArray);
     EXPECT_EQ(computeForwardHalf(handle, samples.data(), nullptr), transformNullArray);
+    EXPECT_EQ(computeBackwardBlock(handle, nullptr, samples.data()), transformNullArray);
+    EXPECT_EQ(computeBackwardBlock(nullptr, bins.data(), samples.data()), transformEmptyHandle);
     EXPECT_EQ(computeBackwardMiddle(handle, nullptr, samples.data(), 4), transformNullArray);
     EXPECT_EQ(computeBackwardMiddle(handle, bins.data(), nullptr, 4), transformNullArray);
     EXPECT_EQ(computeBackwardMiddle(handle, bins.data(), samples.data(), -1), transformOk);

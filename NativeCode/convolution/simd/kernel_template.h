@@ -613,6 +613,34 @@ void backwardMiddleLanes(const TransformTables& tables,
     }
 }
 
+/// Only the second half of the samples, to `output` on: `M` floats. `scratch` is as large as
+/// `work`.
+template <class Lanes>
+void backwardBlockLanes(const TransformTables& tables,
+                        const ComplexBin* bins,
+                        float* output,
+                        float* work,
+                        float* scratch) {
+    constexpr Index count = Lanes::count;
+    transformColumns<Lanes>(tables, BinSource<Lanes>(tables, bins), work, scratch,
+                            WantedRows{tables.columns});
+    const SampleSink<Lanes> sink{output - tables.points};
+    if constexpr (count == 1) {
+        for (Index k = tables.points / 2; k < tables.points; ++k) {
+            sink(k, loadGroup<Lanes>(work, k));
+        }
+    } else {
+        const Index columns = tables.columns;
+        acrossRows<Lanes>(tables, work, columns / count,
+                          [&](Index k0, const Complex<Lanes>(&x)[count]) {
+                              TESSALY_KERNEL_UNROLL
+                              for (Index d = count / 2; d < count; ++d) {
+                                  sink(k0 + columns * d, x[d]);
+                              }
+                          });
+    }
+}
+
 // ---- Operations on bins ----
 
 TESSALY_KERNEL_INLINE ComplexBin product(ComplexBin a, ComplexBin b) {

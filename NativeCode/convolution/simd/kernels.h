@@ -59,6 +59,13 @@ struct Kernels {
                            float* output,
                            float* work,
                            std::size_t samples);
+    /// As `backward`, of which only samples M to 2M - 1 are made: `output` holds M floats.
+    /// `scratch` is as large as `work`, and apart from it.
+    void (*backwardBlock)(const TransformTables& tables,
+                          const ComplexBin* bins,
+                          float* output,
+                          float* work,
+                          float* scratch);
     /// y = a * b and y = a + b, bit for bit the same in every table; y may be a or b.
     void (*multiply)(std::size_t bins, const ComplexBin* a, const ComplexBin* b, ComplexBin* y);
     void (*add)(std::size_t bins, const ComplexBin* a, const ComplexBin* b, ComplexBin* y);

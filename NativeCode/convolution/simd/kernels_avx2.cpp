@@ -52,6 +52,20 @@ void backward(const TransformTables& tables, const ComplexBin* bins, float* outp
     backwardLanes<LanesScalar>(tables, bins, output, work);
 }
 
+void backwardBlock(const TransformTables& tables,
+                   const ComplexBin* bins,
+                   float* output,
+                   float* work,
+                   float* scratch) {
+    if (tables.lanes == 8) {
+        return backwardBlockLanes<Lanes8>(tables, bins, output, work, scratch);
+    }
+    if (tables.lanes == 4) {
+        return backwardBlockLanes<Lanes4>(tables, bins, output, work, scratch);
+    }
+    backwardBlockLanes<LanesScalar>(tables, bins, output, work, scratch);
+}
+
 void backwardMiddle(const TransformTables& tables,
                     const ComplexBin* bins,
                     float* output,
@@ -72,6 +86,7 @@ constexpr Kernels table{.name = "avx2",
                         .forwardHalf = forwardHalf,
                         .backward = backward,
                         .backwardMiddle = backwardMiddle,
+                        .backwardBlock = backwardBlock,
                         .multiply = multiplyBins<Lanes8>,
                         .add = addBins<Lanes8>,
                         .ringSum = sumRing<Lanes8>,

@@ -64,6 +64,23 @@ void backward(const TransformTables& tables, const ComplexBin* bins, float* outp
     backwardLanes<LanesScalar>(tables, bins, output, work);
 }
 
+void backwardBlock(const TransformTables& tables,
+                   const ComplexBin* bins,
+                   float* output,
+                   float* work,
+                   float* scratch) {
+    if (tables.lanes == 16) {
+        return backwardBlockLanes<Lanes16>(tables, bins, output, work, scratch);
+    }
+    if (tables.lanes == 8) {
+        return backwardBlockLanes<Lanes8>(tables, bins, output, work, scratch);
+    }
+    if (tables.lanes == 4) {
+        return backwardBlockLanes<Lanes4>(tables, bins, output, work, scratch);
+    }
+    backwardBlockLanes<LanesScalar>(tables, bins, output, work, scratch);
+}
+
 void backwardMiddle(const TransformTables& tables,
                     const ComplexBin* bins,
                     float* output,
@@ -87,6 +104,7 @@ constexpr Kernels table{.name = "avx512",
                         .forwardHalf = forwardHalf,
                         .backward = backward,
                         .backwardMiddle = backwardMiddle,
+                        .backwardBlock = backwardBlock,
                         .multiply = multiplyBins<Lanes16>,
                         .add = addBins<Lanes16>,
                         .ringSum = sumRing<Lanes16>,

@@ -42,6 +42,17 @@ void backward(const TransformTables& tables, const ComplexBin* bins, float* outp
     backwardLanes<LanesScalar>(tables, bins, output, work);
 }
 
+void backwardBlock(const TransformTables& tables,
+                   const ComplexBin* bins,
+                   float* output,
+                   float* work,
+                   float* scratch) {
+    if (tables.lanes == 4) {
+        return backwardBlockLanes<LanesNeon>(tables, bins, output, work, scratch);
+    }
+    backwardBlockLanes<LanesScalar>(tables, bins, output, work, scratch);
+}
+
 void backwardMiddle(const TransformTables& tables,
                     const ComplexBin* bins,
                     float* output,
@@ -59,6 +70,7 @@ constexpr Kernels table{.name = "neon",
                         .forwardHalf = forwardHalf,
                         .backward = backward,
                         .backwardMiddle = backwardMiddle,
+                        .backwardBlock = backwardBlock,
                         .multiply = multiplyBins<LanesNeon>,
                         .add = addBins<LanesNeon>,
                         .ringSum = sumRing<LanesNeon>,

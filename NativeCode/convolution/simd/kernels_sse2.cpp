@@ -40,6 +40,17 @@ void backward(const TransformTables& tables, const ComplexBin* bins, float* outp
     backwardLanes<LanesScalar>(tables, bins, output, work);
 }
 
+void backwardBlock(const TransformTables& tables,
+                   const ComplexBin* bins,
+                   float* output,
+                   float* work,
+                   float* scratch) {
+    if (tables.lanes == 4) {
+        return backwardBlockLanes<Lanes4>(tables, bins, output, work, scratch);
+    }
+    backwardBlockLanes<LanesScalar>(tables, bins, output, work, scratch);
+}
+
 void backwardMiddle(const TransformTables& tables,
                     const ComplexBin* bins,
                     float* output,
@@ -57,6 +68,7 @@ constexpr Kernels table{.name = "sse2",
                         .forwardHalf = forwardHalf,
                         .backward = backward,
                         .backwardMiddle = backwardMiddle,
+                        .backwardBlock = backwardBlock,
                         .multiply = multiplyBins<Lanes4>,
                         .add = addBins<Lanes4>,
                         .ringSum = sumRing<Lanes4>,
