@@ -167,10 +167,8 @@ bool convClass::findFarCorrections(const RingView& ring,
     }
     const std::size_t partitions = filterPartsL.size();
     const std::size_t first = far_->firstPartition();
-    for (const std::size_t begin : {before.begin, now.begin}) {
-        if (begin > first && begin < partitions) {
-            return false;
-        }
+    if (!standsBeforeFar(before) || !standsBeforeFar(now)) {
+        return false;
     }
     const std::uint64_t block = far_->block();
     for (std::size_t i = first; i < partitions; ++i) {
@@ -197,6 +195,12 @@ bool convClass::findFarCorrections(const RingView& ring,
         }
     }
     return true;
+}
+
+/// What has the gain of the end in its samples lies before the far tail, or all of the response
+/// has.
+bool convClass::standsBeforeFar(const ScaledPartitions& scaled) const noexcept {
+    return scaled.begin <= far_->firstPartition() || scaled.begin >= filterPartsL.size();
 }
 
 void convClass::addFarHeld() noexcept {

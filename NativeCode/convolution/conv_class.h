@@ -252,6 +252,7 @@ private:
                             const RingView& other,
                             const ScaledPartitions& before,
                             const ScaledPartitions& now) noexcept;
+    bool standsBeforeFar(const ScaledPartitions& scaled) const noexcept;
     void addFarHeld() noexcept;
     void subtractFarExpected(const EarSpectra& sum, float gain) noexcept;
 

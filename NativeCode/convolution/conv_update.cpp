@@ -150,7 +150,7 @@ void convClass::advanceFarTail(bool silent) noexcept {
     if (!copied && notes_ != nullptr && notes_->written.hull().end > near) {
         far_->responseChanged();  // written, but not taken yet
     }
-    far_->advance(input, silent, left, right);
+    far_->advance(input, silent, standsBeforeFar(scaled_), left, right);
 }
 
 /// Compensation of the whole response at once. Its handles are never created, so every transform

@@ -3,6 +3,7 @@
 
 #include <algorithm>
 #include <bit>
+#include <cstdint>
 #include <cstring>
 
 #include "base/ess_error.h"
@@ -41,13 +42,13 @@ FarTail::~FarTail() {
     }
 }
 
-std::int32_t FarTail::ratioFor(std::size_t partitions) noexcept {
+std::int32_t FarTail::ratioFor(std::int32_t partitions, std::int32_t early) noexcept {
     // 2 R partitions are read in every block, and the far ones once in R blocks.
-    std::size_t ratio = smallestRatio;
-    while (8 * ratio * ratio <= partitions) {
+    std::int64_t ratio = smallestRatio;
+    while (2 * ratio < early || 8 * ratio * ratio <= partitions) {
         ratio *= 2;
     }
-    return static_cast<std::int32_t>(ratio);
+    return static_cast<std::int32_t>(std::min<std::int64_t>(ratio, INT32_MAX));
 }
 
 bool FarTail::prepare(const Kernels& kernels,
@@ -133,10 +134,8 @@ bool FarTail::zerosThroughout() const noexcept {
     return silentRun_ > 4 * static_cast<std::uint64_t>(ratio_);
 }
 
-void FarTail::advance(const float* window,
-                      bool silent,
-                      const float* left,
-                      const float* right) noexcept {
+void FarTail::advance(
+    const float* window, bool silent, bool wanted, const float* left, const float* right) noexcept {
     const auto length = static_cast<std::size_t>(blockLength_);
     const auto ratio = static_cast<std::size_t>(ratio_);
     silentRun_ = silent ? silentRun_ + 1 : 0;
@@ -147,7 +146,7 @@ void FarTail::advance(const float* window,
     }
     const auto phase = static_cast<std::int32_t>(blocks_ % ratio);
     if (phase == 0) {
-        startRound();
+        startRound(wanted);
     }
     if (!zerosThroughout()) {
         std::memcpy(filling_.data() + static_cast<std::size_t>(phase) * length, window + length,
@@ -168,7 +167,7 @@ void FarTail::advance(const float* window,
 }
 
 /// A whole L is complete: what was made is heard from now on, and the next result is begun.
-void FarTail::startRound() noexcept {
+void FarTail::startRound(bool wanted) noexcept {
     std::swap(result_, next_);
     resultStands_ = computing_;
     resultSilent_ = nextSilent_;
@@ -184,7 +183,7 @@ void FarTail::startRound() noexcept {
         FFT(window_.data(), memory_[inputMemory] + newest_ * stride_, transform_);
     }
 
-    computing_ = built_ == ears * parts_;
+    computing_ = wanted && built_ == ears * parts_;
     pairs_ = 0;
     for (std::size_t i = 0; computing_ && i < parts_; ++i) {
         const std::size_t slot = (newest_ + parts_ - i) % parts_;

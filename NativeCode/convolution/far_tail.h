@@ -24,14 +24,17 @@ namespace tessaly {
 class FarTail {
 public:
     static constexpr std::int32_t smallestRatio = 4;
+    /// Its memory pays back from responses of so many blocks on.
+    static constexpr std::int32_t fewestPartitions = 48;
 
     FarTail() = default;
     ~FarTail();
     FarTail(const FarTail&) = delete;
     FarTail& operator=(const FarTail&) = delete;
 
-    /// R for a response of so many partitions: near part and far part cost about the same.
-    static std::int32_t ratioFor(std::size_t partitions) noexcept;
+    /// R for a response of so many partitions, of which the first `early` may not belong to the far
+    /// part: near part and far part cost about the same.
+    static std::int32_t ratioFor(std::int32_t partitions, std::int32_t early) noexcept;
 
     /// Load time: allocates, some 12 bytes a sample of the far part.
     /// @param blockLength  B
@@ -51,8 +54,13 @@ public:
     /// Takes a block and does its share of the work. Block time.
     /// @param window  2B samples, the last block's and the new ones
     /// @param silent  the window is known to be zeros
+    /// @param wanted  results can be heard; else none is made
     /// @param left, right  the response, `partitions` * B samples each, without the gain of its end
-    void advance(const float* window, bool silent, const float* left, const float* right) noexcept;
+    void advance(const float* window,
+                 bool silent,
+                 bool wanted,
+                 const float* left,
+                 const float* right) noexcept;
     /// Samples of the far part are not those of the block before. Block time.
     void responseChanged() noexcept;
 
@@ -72,7 +80,7 @@ private:
     bool allocate(std::size_t partitions);
     bool continues(const float* window) const noexcept;
     bool zerosThroughout() const noexcept;
-    void startRound() noexcept;
+    void startRound(bool wanted) noexcept;
     void buildNext(const float* left, const float* right) noexcept;
     void sumShare(std::int32_t phase) noexcept;
     void transformBack(std::size_t ear) noexcept;

@@ -1,4 +1,5 @@
 // An engine's life at its two ends: construction in order, `Stop`, destruction.
+#include <algorithm>
 #include <cmath>
 #include <new>
 #include <utility>
@@ -21,8 +22,6 @@ constexpr float ratioAt24000 = 0.5442177f;      // 24000 / 44100
 constexpr float ratioAt48000 = 1.0884354f;      // 48000 / 44100
 constexpr double firstDistanceOffset = 0.4;     // metres: the first block must see a change
 constexpr float firstInterpAngleOffset = 5.0f;  // degrees: the first blend takes the new buffer
-// A far tail takes memory of its own, which only long responses pay back.
-constexpr int fewestFarPartitions = 96;
 constexpr std::size_t debugDumpBytes = 8519680;
 constexpr const char* stopLine = "___tessCore_Stop";
 
@@ -233,14 +232,25 @@ void allocateBuffers(EngineState& state) {
     }
 }
 
+/// Partitions that direct sound and reflections touch where they stand now, and one to spare.
+int earlyPartitions(const EngineState& state) {
+    const Reflections& reflections = state.reflections;
+    int last = 0;
+    for (int k = 0; k < std::min<int>(reflections.flexReflectionCount, Reflections::capacity);
+         ++k) {
+        last = std::max<int>(last, reflections.records[static_cast<std::size_t>(k)].delaySamples);
+    }
+    return (last + state.switches.hrirLength) / state.sizes.blocklenght + 2;
+}
+
 bool buildConvolvers(EngineState& state) {
     state.firstOLS = makeConvolver(state, "firstOLSfeeded-Instanz", false);
     // Blended responses are written whole, and little of them differs from block to block.
     state.firstOLS->watch(&state.composer.notes,
                           state.switches.qvInterpolateFilters ? state.sizes.firBufferSize : 0);
-    if (state.sizes.fdlCount >= fewestFarPartitions && !state.switches.qvInterpolateFilters) {
+    if (state.sizes.fdlCount >= FarTail::fewestPartitions && !state.switches.qvInterpolateFilters) {
         state.firstOLS->splitFarTail(
-            FarTail::ratioFor(static_cast<std::size_t>(state.sizes.fdlCount)));
+            FarTail::ratioFor(state.sizes.fdlCount, earlyPartitions(state)));
     }
     if (state.switches.fading) {
         state.secondOLS = makeConvolver(state, "secondOLSfeeded-Instanz", true);

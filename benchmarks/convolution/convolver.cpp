@@ -9,8 +9,6 @@ namespace {
 
 /// Samples of an old response that are heard after a change.
 constexpr std::int32_t crossfade = 64;
-/// From so many partitions on an engine has the far part made from larger ones.
-constexpr std::int16_t fewestFarPartitions = 96;
 
 }  // namespace
 
@@ -31,8 +29,8 @@ Convolver::Convolver(std::int32_t blockLength, std::int32_t taps)
         fir_[ear] = firs_[ear].data();
     }
     first_ = make(0, output_[0], output_[1]);
-    if (partitions_ >= fewestFarPartitions) {
-        first_->splitFarTail(FarTail::ratioFor(static_cast<std::size_t>(partitions_)));
+    if (partitions_ >= FarTail::fewestPartitions) {
+        first_->splitFarTail(FarTail::ratioFor(partitions_, 0));
     }
     second_ = make(1, output_[2], output_[3]);
     second_->filterPartsL = first_->filterPartsL;
