@@ -161,7 +161,7 @@ void FirComposer::listIngredients(const CompositionInputs& inputs) noexcept {
         }
     };
     wanted_.pieces.clear();
-    listedTables_ = hrirTablesVersion;
+    listedStream_ = hrirStreamNumber;
     add(directPiece(inputs));
     const EffectiveSettings& switches = inputs.switches;
     const Reflections& reflections = inputs.reflections;
@@ -282,8 +282,8 @@ bool FirComposer::catchUp(CompositionInputs& inputs) noexcept {
         return false;
     }
     postponed_ = false;
-    if (listedTables_ != hrirTablesVersion) {
-        // The HRIRs that were listed may be gone: as the source stands now.
+    if (!hrirStreamLives(listedStream_)) {
+        // The HRIRs that were listed are gone: as the source stands now.
         listIngredients(inputs);
     }
     writeChanges(inputs);

@@ -106,8 +106,8 @@ private:
     Ingredients standing_;            ///< of the responses as they stand
     PieceWriter writer_;              ///< for the engine's responses
     PieceWriter plainWriter_;         ///< keeps nothing
-    std::uint32_t listedTables_ = 0;  ///< version of the HRIR tables behind `wanted_`
-    std::uint32_t lastTables_ = 0;    ///< and behind what stands
+    std::uint32_t listedStream_ = 0;  ///< packed HRIR set that `wanted_` points into
+    std::uint32_t lastTables_ = 0;    ///< version of the HRIR tables behind what stands
     bool startKnown_ = false;         ///< up to the scaled end: what the last ingredients make
     bool endKnown_ = false;           ///< from there on
     bool postponed_ = false;          ///< the responses are behind `wanted_`

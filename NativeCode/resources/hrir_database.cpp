@@ -83,7 +83,8 @@ bool HrirDatabase::load(int instanceNumber, HrirRequest request) {
     if (HRTFStream != nullptr) {
         logOutput("Deleted HRTFSTream!");
     }
-    replaceHrirStream(settings_.hrirLength);
+    // Other engines may still have to write responses that they listed with the former HRIRs.
+    replaceHrirStream(settings_.hrirLength, instanceNumber != 0);
 
     const std::string path = settings_.bundleBasePath + databaseFileName;
     if (!fileExists(path)) {

@@ -16,12 +16,14 @@ constinit HrirSlot filterTable[gridCellCount] = {};
 constinit int nextFreeHrir = 0;
 constinit std::uint8_t databaseBypassMode = 0;
 constinit std::uint32_t hrirTablesVersion = 0;
+constinit std::uint32_t hrirStreamNumber = 0;
 
 namespace {
 
 // Held until the process ends: engines of other handlers compose from these at any time, long
 // after the engine that loaded them has gone.
 constinit ProcessLifetime<AlignedArray<float>> streamOwner;
+constinit ProcessLifetime<AlignedArray<float>> formerOwner;
 constinit ProcessLifetime<std::vector<AlignedArray<float>>> entryOwners;
 
 }  // namespace
@@ -39,7 +41,7 @@ const float* hrirAt(int indexPhi, int indexTheta) noexcept {
     return cell != nullptr ? hrirOf(*cell) : nullptr;
 }
 
-void replaceHrirStream(int hrirLength) {
+void replaceHrirStream(int hrirLength, bool keepFormer) {
     const auto stride = static_cast<std::size_t>(std::max(hrirLength, 0)) * 2;
     // The zero frames behind the last HRIR are for engines whose HRIRs are longer than these.
     AlignedArray<float> stream(stride * hrirCount + std::size_t{hrirMaxLength} * 2);
@@ -48,7 +50,13 @@ void replaceHrirStream(int hrirLength) {
     }
     HRTFStream = stream.data();
     ++hrirTablesVersion;
+    ++hrirStreamNumber;
+    *formerOwner = keepFormer ? std::move(*streamOwner) : AlignedArray<float>();
     *streamOwner = std::move(stream);
+}
+
+bool hrirStreamLives(std::uint32_t number) noexcept {
+    return number == hrirStreamNumber || (number + 1 == hrirStreamNumber && !formerOwner->empty());
 }
 
 HrirSlot appendHrir(int hrirLength) {
@@ -70,7 +78,9 @@ void resetHrirTables() {
     nextFreeHrir = 0;
     databaseBypassMode = 0;
     ++hrirTablesVersion;
+    hrirStreamNumber = 0;
     *streamOwner = {};
+    *formerOwner = {};
     entryOwners->clear();
 }
 

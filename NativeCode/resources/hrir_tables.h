@@ -30,6 +30,12 @@ extern constinit std::uint8_t databaseBypassMode;
 /// made of them knows. Written by database loads.
 extern constinit std::uint32_t hrirTablesVersion;
 
+/// Steps with each packed set, counted from 1; 0 before the first.
+extern constinit std::uint32_t hrirStreamNumber;
+/// Whether the samples of a set are still there: those of the present one, and those of the one
+/// before it where it was kept. Block time.
+bool hrirStreamLives(std::uint32_t number) noexcept;
+
 /// The cell of a direction, or null for indices off the grid. Block time.
 HrirSlot* filterTableCell(int indexPhi, int indexTheta) noexcept;
 
@@ -41,10 +47,11 @@ inline const float* hrirOf(HrirSlot slot) noexcept { return slot != nullptr ? *s
 const float* hrirAt(int indexPhi, int indexTheta) noexcept;
 
 /// Replaces the packed set by `hrirCount` HRIRs of silence and points `hrirTable` at them, all of
-/// it, so that readers through older cells find memory whatever the file read then brings. The old
-/// set is released. Load time: allocates.
+/// it, so that readers through older cells find memory whatever the file read then brings. Load
+/// time: allocates.
 /// @param hrirLength  frames per HRIR, the stride of the new set
-void replaceHrirStream(int hrirLength);
+/// @param keepFormer  the set before lives until the next call; else it is released
+void replaceHrirStream(int hrirLength, bool keepFormer = false);
 
 /// Puts an HRIR of silence with an array of its own into the entry `nextFreeHrir` and steps that.
 /// The array lives until the process ends. Load time: allocates.

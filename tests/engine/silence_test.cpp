@@ -107,33 +107,62 @@ INSTANTIATE_TEST_SUITE_P(Scenes,
                                          Scene{"reflections", 25, true, 1, true}),
                          [](const auto& tested) { return std::string(tested.param.name); });
 
-TEST_F(EngineFixture, AResponseThatNobodyHeardOutlivesItsHrirs) {
-    TempDirectory directory;
-    writePackedHrirSet(directory.path(), 48000);
-    const LogCapture quiet;
-    EngineRig rig(directory.path(), 48000, block);
-    rig.settings.qvTrackDirection = 1;
-    rig.settings.alwaysUpdateFilter = 0;  // composes when it moves, and not when it wakes
-    rig.build();
-    for (int n = 0; n < 40; ++n) {
-        rig.azimuth = static_cast<std::int16_t>(n * 2);
+/// A source that moved in silence, and then loads of other engines that replace its HRIRs.
+class ReplacedHrirs : public EngineFixture {
+protected:
+    ReplacedHrirs() : rig(directory_.path(), 48000, block) {
+        writePackedHrirSet(directory_.path(), 48000);
+        rig.settings.qvTrackDirection = 1;
+        rig.settings.alwaysUpdateFilter = 0;  // composes when it moves, and not when it wakes
+        rig.build();
+        for (int n = 0; n < 40; ++n) {
+            rig.azimuth = static_cast<std::int16_t>(n * 2);
+            rig.run();
+        }
+        EXPECT_TRUE(rig.state().composer.isBehind());
+        former = direct();
+    }
+    /// The HRIR's first sample as the direct sound takes it.
+    float direct() {
+        const SourceDirection& direction = rig.state().direction;
+        return hrirAt(direction.indexPhi, direction.indexTheta)[1] * rig.state().law.directGain *
+               rig.mix.directGain;
+    }
+    void loadAnother(bool bypass) {
+        EngineRig other(directory_.path(), 48000, block);
+        other.settings.qvTrackDirection = 1;
+        other.settings.bypass3DAudio = bypass;
+        other.build();
+    }
+    float wake() {
+        rig.input.assign(rig.input.size(), 0.5f);
         rig.run();
+        EXPECT_FALSE(rig.state().composer.isBehind());
+        return composedSample(rig.state().composer, 0, 0);
     }
-    ASSERT_TRUE(rig.state().composer.isBehind());
-    // Another engine puts other HRIRs in their place, in other memory.
-    EngineRig other(directory.path(), 48000, block);
-    other.settings.qvTrackDirection = 1;
-    other.settings.bypass3DAudio = true;
-    other.build();
-    other.engine.reset();
-    for (std::size_t i = 0; i < rig.input.size(); i += 2) {
-        rig.input[i] = 0.5f;
-    }
-    rig.run();
-    EXPECT_FALSE(rig.state().composer.isBehind());
-    EXPECT_EQ(composedSample(rig.state().composer, 0, 0),
-              hrirAt(rig.state().direction.indexPhi, rig.state().direction.indexTheta)[1] *
-                  rig.state().law.directGain * rig.mix.directGain);
+
+private:
+    TempDirectory directory_;
+    LogCapture quiet_;
+
+protected:
+    EngineRig rig;
+    float former = 0.0f;
+};
+
+TEST_F(ReplacedHrirs, AResponseThatNobodyHeardIsWrittenWithItsOwn) {
+    loadAnother(true);
+    EXPECT_NE(direct(), former);
+    EXPECT_EQ(wake(), former);
+}
+
+TEST_F(ReplacedHrirs, AfterTwoLoadsItIsWrittenWithThoseOfNow) {
+    loadAnother(true);
+    loadAnother(false);
+    loadAnother(true);
+    const float now = direct();
+    EXPECT_NE(now, former);
+    EXPECT_EQ(wake(), now);
 }
 
 TEST_F(EngineFixture, AStopWritesTheResponseThatNobodyHeard) {
