@@ -256,6 +256,7 @@ void convClass::processCrossfade(convClass& second, std::int32_t heardOfOld) noe
         return;
     }
     second.watchSelection();
+    second.resultSilent_ = false;  // its results are written here, past its own knowledge
     const bool silent = second.takeInput(blockNumber());
     watchSelection();
     const bool update = filterChangeAll || forceUpdateAll;

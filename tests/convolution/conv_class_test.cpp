@@ -390,6 +390,30 @@ TEST_F(ConvClass, TimePartsHoldTheSamplesOfTheirPartition) {
     }
 }
 
+TEST_F(ConvClass, SilenceAfterASharedBlockIsSilentInThePlainOrderToo) {
+    ConvolverRig rig(16, 1);
+    rig.makeBoth();
+    Noise noise(31);
+    std::ranges::copy(noise.samples(16), rig.filterLeft.begin());
+    const std::vector<float> silence(16);
+    const auto play = [&rig](const std::vector<float>& block, bool shared) {
+        rig.heardOfOld = shared ? 16 : -1;
+        rig.feed(block);
+        rig.run(true);
+    };
+    play(noise.samples(16), true);
+    for (int n = 0; n < 4; ++n) {
+        play(silence, false);  // the second instance knows its results to be zeros
+    }
+    play(noise.samples(16), true);
+    ASSERT_NE(rig.secondLeft[20], 0.0f);
+    play(silence, true);
+    play(silence, false);
+    play(silence, false);
+    EXPECT_THAT(std::vector<float>(rig.secondLeft.begin() + 16, rig.secondLeft.end()), Each(0.0f));
+    EXPECT_THAT(std::vector<float>(rig.firstLeft.begin() + 16, rig.firstLeft.end()), Each(0.0f));
+}
+
 TEST_F(ConvClass, SecondInstanceNeverWritesTheFilter) {
     ConvolverRig rig(16, 2);
     rig.makeBoth();
