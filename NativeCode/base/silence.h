@@ -24,9 +24,12 @@ inline bool isSilent(const float* samples, std::size_t count) noexcept TESSALY_N
 }
 
 /// All samples are zero, of either sign. Stops soon after the first that is not. Block time.
-inline bool allZero(const float* samples, std::size_t count) noexcept {
+inline bool allZero(const float* samples, std::size_t count) noexcept TESSALY_NONBLOCKING {
     constexpr std::size_t group = 64;
     constexpr std::uint32_t withoutSign = 0x7fffffffu;
+    if (isSilent(samples, count)) {
+        return true;
+    }
     std::size_t i = 0;
     for (; i + group <= count; i += group) {
         std::uint32_t bits = 0;

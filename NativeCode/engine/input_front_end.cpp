@@ -50,6 +50,10 @@ bool isAtRest(const Biquad& filter) noexcept {
 
 /// As allZero, for one channel of stereo frames.
 bool isSilent(const float* channel, int frames) noexcept {
+    // Both channels mostly are, and side by side they are looked through faster.
+    if (frames > 0 && tessaly::isSilent(channel, 2 * static_cast<std::size_t>(frames) - 1)) {
+        return true;
+    }
     constexpr int together = 16;  // frames between two looks at the result
     int i = 0;
     for (; i + together <= frames; i += together) {
