@@ -4,18 +4,21 @@ from report.tables import block_share, load_summary, one_more
 
 
 class Goal:
-    """One row. `measure` returns (figure, where) pairs; the least favourable one counts."""
+    """One row. `measure` returns (figure, where) pairs; the least favourable one counts. `needs`
+    names the processor's instructions without which there is nothing to measure."""
 
-    def __init__(self, what, against, target, at_least, unit, measure, missing="not measured"):
+    def __init__(self, what, against, target, at_least, unit, measure, needs=(), hint=""):
         self.what, self.against, self.target = what, against, target
         self.at_least, self.unit = at_least, unit
-        self.measure, self.missing = measure, missing
+        self.measure, self.needs, self.hint = measure, needs, hint
 
-    def result(self, groups):
-        """Returns (figure, text, verdict, where); the figure is None if there is none."""
+    def result(self, groups, instructions):
+        """Returns (figure, text, verdict, where); the figure is None if there is none.
+        `instructions` are those of the processor, empty if nobody knows."""
         found = self.measure(groups)
         if not found:
-            return None, self.missing, "-", ""
+            lacking = instructions and not set(self.needs) <= set(instructions)
+            return None, "not measurable here" if lacking else "no rows" + self.hint, "-", ""
         figure, where = (min if self.at_least else max)(found, key=lambda pair: pair[0])
         met = figure >= self.target if self.at_least else figure <= self.target
         return figure, self.text(figure), "yes" if met else "NO", where
@@ -36,12 +39,14 @@ def ratios(rows, slow, fast, chosen):
     ]
 
 
-def transform(variant):
+def transform(*variants):
     def measure(groups):
-        lengths = ("512", "1024", "2048")
-        return ratios(
-            groups.get("Transform", {}), "fftw", variant, lambda length: length in lengths
-        )
+        rows, lengths = groups.get("Transform", {}), ("512", "1024", "2048")
+        return [
+            pair
+            for variant in variants
+            for pair in ratios(rows, "fftw", variant, lambda length: length in lengths)
+        ]
 
     return measure
 
@@ -128,23 +133,24 @@ def loads(index):
     return measure
 
 
-NO_AVX512 = "not measurable here"
-AVX2 = "avx2 not measured"
+AVX512 = ("avx512f",)
+AVX2 = ("avx2", "fma")
 
 GOALS = [
     Goal("forward + backward, 2B 512 to 2048, AVX2", "FFTW, measured plans", 1.2, True, " x",
          transform("tessaly_avx2"), AVX2),
     Goal("same, AVX-512", "FFTW, measured plans", 1.8, True, " x",
-         transform("tessaly_avx512"), NO_AVX512),
-    Goal("same, 4 lanes", "FFTW, measured plans", 0.6, True, " x", transform("tessaly_sse2")),
+         transform("tessaly_avx512"), AVX512),
+    Goal("same, 4 lanes", "FFTW, measured plans", 0.6, True, " x",
+         transform("tessaly_sse2", "tessaly_neon")),
     Goal("multiply-accumulate, both ears, N >= 16, AVX2", "plain scalar passes", 7.0, True, " x",
          multiply("plain", "avx2", lambda block, partitions: int(partitions) >= 16), AVX2),
     Goal("same, AVX-512, B 1024, N 216", "time to read the same bytes", 1.4, False, " x",
-         multiply("avx512", "read", lambda *key: key == ("1024", "216")), NO_AVX512),
+         multiply("avx512", "read", lambda *key: key == ("1024", "216")), AVX512),
     Goal("convolver, still, 128 to 23147 taps, AVX2", "zita-convolver, uniform", 2.2, True, " x",
          convolver("tessaly_avx2", 128, 23147), AVX2),
     Goal("same, AVX-512", "zita-convolver, uniform", 3.3, True, " x",
-         convolver("tessaly_avx512", 128, 23147), NO_AVX512),
+         convolver("tessaly_avx512", 128, 23147), AVX512),
     Goal("convolver, still, 81533 and 220245 taps", "zita-convolver, uniform", 1.8, True, " x",
          widest_convolver(81533, 220245)),
     Goal("moving source, hall of N 73, B 1024", "the same standing still", 1.5, False, " x",
@@ -152,7 +158,7 @@ GOALS = [
     Goal("moving source, hall of N 216, B 1024", "the same standing still", 1.5, False, " x",
          motions("longest", "moving", "still", "1024")),
     Goal("moving source, hall of N 216, B 1024", "the earlier library", 6.0, True, " x",
-         against_before("longest", "1024"), "not measured (--against)"),
+         against_before("longest", "1024"), hint=" (--against)"),
     Goal("64 moving dry sources, B 1024", "OpenAL Soft, per source", 1.5, True, " x",
          dry_against_openal),
     Goal("64 moving sources with reflections (N 8), two returns (N 73)", "one core", 0.10, False,
@@ -166,23 +172,24 @@ GOALS = [
 HEAD = ["what", "against", "measured", "target", "met", "least favourable"]
 
 
-def goal_lines(groups):
+def goal_lines(groups, instructions):
     lines = []
     for goal in GOALS:
-        _, text, verdict, where = goal.result(groups)
+        _, text, verdict, where = goal.result(groups, instructions)
         lines.append([goal.what, goal.against, text, goal.target_text(), verdict, where])
     return lines
 
 
-def goal_records(groups):
+def goal_records(groups, instructions):
     entries = []
     for goal in GOALS:
-        figure, _, verdict, where = goal.result(groups)
+        figure, text, verdict, where = goal.result(groups, instructions)
         entries.append(
             {
                 "what": goal.what,
                 "against": goal.against,
                 "measured": figure,
+                "text": text,
                 "target": goal.target,
                 "at_least": goal.at_least,
                 "met": {"yes": True, "NO": False}.get(verdict),

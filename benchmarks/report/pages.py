@@ -25,34 +25,46 @@ def conditions(content):
 
 HOW_TO_READ = [
     "In brackets: how many times as fast as the reference, which is 1.00; more is faster.",
-    f"~ marks figures that vary by more than {UNSTEADY:.0%}: run again on a quiet machine.",
+    f"~ marks figures whose middle half of repetitions spans more than {200 * UNSTEADY:.0f} % of their "
+    "median: run again on a quiet machine.",
 ]
 
 
-def must_show(groups):
-    return Table("Must show, ratios of this run", HEAD, goal_lines(groups), [])
+def must_show(groups, content):
+    lines = goal_lines(groups, content["machine"]["instructions"])
+    return Table("Must show, ratios of this run", HEAD, lines, [])
 
 
 def page_text(groups, content):
     parts = ["\n".join(conditions(content) + HOW_TO_READ)]
     parts += [as_text(table) for _, table in all_tables(groups)]
-    parts.append(as_text(must_show(groups)))
+    parts.append(as_text(must_show(groups, content)))
     return "\n\n".join(parts)
 
 
 def page_markdown(groups, content):
     parts = ["\n".join(f"- {line}" for line in conditions(content) + HOW_TO_READ)]
-    parts += [as_markdown(must_show(groups))]
+    parts += [as_markdown(must_show(groups, content))]
     parts += [as_markdown(table) for _, table in all_tables(groups)]
     return "\n\n".join(parts)
 
 
-def write_markdown(path, text):
-    """Writes the file, or what stands between its two marks if it has them."""
+def around_figures(path):
+    """What stands before and behind the figures of a page; a file to be written has neither.
+
+    Raises ValueError for a file without the marks: what it holds is not ours to replace."""
     path = Path(path)
-    page = path.read_text(encoding="utf-8") if path.exists() else f"{BEGIN}\n{END}\n"
-    if BEGIN not in page or END not in page:
-        page = f"{BEGIN}\n{END}\n"
-    head, rest = page.split(BEGIN, 1)
-    tail = rest.split(END, 1)[1]
-    path.write_text(f"{head}{BEGIN}\n\n{text}\n\n{END}{tail}", encoding="utf-8")
+    if not path.exists():
+        return "", "\n"
+    head, begin, rest = path.read_text(encoding="utf-8").partition(BEGIN)
+    _, end, tail = rest.partition(END)
+    if not begin or not end:
+        raise ValueError(f"{path} has no lines {BEGIN!r} and {END!r} to write between")
+    return head, tail
+
+
+def write_markdown(path, text):
+    """Writes a new file, or what stands between the two marks of an existing one."""
+    head, tail = around_figures(path)
+    page = f"{head}{BEGIN}\n\n{text}\n\n{END}{tail}"
+    Path(path).write_text(page, encoding="utf-8")

@@ -53,11 +53,19 @@ def built_programs(folder):
     )
 
 
+def pinned_to(cpu):
+    """The core that programs run on, None for any: without taskset nobody pins them."""
+    return cpu if shutil.which("taskset") else None
+
+
 def run_program(program, arguments):
     """Runs one program; returns the runs of Google Benchmark's report, one for each repetition."""
     environment = dict(os.environ)
     if arguments.against:
         environment["TESSALY_AGAINST"] = str(Path(arguments.against).resolve())
+    data = ROOT / "build" / "data"
+    if not environment.get("TESSALY_DATA") and data.is_dir():
+        environment["TESSALY_DATA"] = str(data)
     with tempfile.TemporaryDirectory() as folder:
         report = Path(folder) / "report.json"
         command = [
@@ -69,7 +77,7 @@ def run_program(program, arguments):
             f"--benchmark_min_time={arguments.min_time}",
             f"--benchmark_filter={arguments.filter}",
         ]
-        if arguments.cpu is not None and shutil.which("taskset"):
+        if pinned_to(arguments.cpu) is not None:
             command = ["taskset", "-c", str(arguments.cpu), *command]
         # To a file: a pipe's reader would wake up in the middle of what is timed.
         messages = Path(folder) / "messages.txt"
@@ -89,8 +97,8 @@ def run_program(program, arguments):
         return [entry for entry in runs if entry.get("run_type") == "iteration"]
 
 
-def machine(cpu, folder):
-    """What the figures depend on besides the code."""
+def machine(cpu, folder, built):
+    """What the figures depend on besides the code. `built`: the programs are of this very state."""
     model = "unknown processor"
     if shutil.which("lscpu"):
         text = run(["lscpu"], capture_output=True, text=True, env={**os.environ, "LC_ALL": "C"})
@@ -101,7 +109,7 @@ def machine(cpu, folder):
     if info.exists():
         flags = re.search(r"^(?:flags|Features)\s*:(.*)$", info.read_text(), re.MULTILINE)
         words = flags.group(1).split() if flags else []
-        known = ("sse2", "avx", "avx2", "fma", "avx512f", "avx512vl", "asimd")
+        known = ("sse2", "avx", "avx2", "fma", "avx512f", "avx512vl", "asimd", "neon")
         wide = [name for name in known if name in words]
     cache = Path(folder).parent / "CMakeCache.txt"
     cached = cache.read_text(encoding="utf-8") if cache.exists() else ""
@@ -112,16 +120,16 @@ def machine(cpu, folder):
 
     compiler = entry("CMAKE_CXX_COMPILER") or "c++"
     version = run([compiler, "--version"], capture_output=True, text=True).stdout.split("\n")[0]
-    # Programs of another folder may be of any state.
+    # Programs that are run as they are may be of any state.
     commit = "unknown"
-    if Path(folder) == BUILD / "bin":
+    if built:
         describe = ["git", "describe", "--always", "--dirty", "--exclude=*"]
         commit = run(describe, cwd=ROOT, capture_output=True, text=True).stdout.strip()
     return {
         "processor": model,
         "cores": os.cpu_count(),
         "instructions": wide,
-        "pinned_to": cpu,
+        "pinned_to": pinned_to(cpu),
         "load_average": os.getloadavg()[0],
         "compiler": version,
         "flags": f"{entry('CMAKE_CXX_FLAGS')} {entry('CMAKE_CXX_FLAGS_RELEASE')}".strip(),

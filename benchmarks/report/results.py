@@ -34,7 +34,9 @@ class Cell:
 
     @property
     def variation(self):
-        """Half of what the middle half of the repetitions spans, as a share of the median."""
+        """Half of what the middle half of the repetitions spans, as a share of the median.
+
+        With fewer than four repetitions all of them count."""
         if len(self.times) < 4:
             return (max(self.times) - min(self.times)) / 2 / self.median
         quarters = statistics.quantiles(self.times, n=4, method="inclusive")

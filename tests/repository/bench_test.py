@@ -146,10 +146,11 @@ class BenchTables(unittest.TestCase):
 
     def test_loads_are_told_in_blocks_with_their_worst(self):
         block = 1024 / 48000 * 1e9
+        hall = {"heap_bytes": 2048, "label": "Hall"}
         table = table_of(
             "Load",
-            runs("Load/tessaly/31/manual_time", 1, 1, real=block / 2, heap_bytes=2048, label="Hall")
-            + runs("Load/tessaly/31/manual_time", 1, real=block * 1.25, heap_bytes=2048, label="Hall")
+            runs("Load/tessaly/31/manual_time", 1, 1, real=block / 2, **hall)
+            + runs("Load/tessaly/31/manual_time", 1, real=block * 1.25, **hall)
             + runs("Load/tessaly/9/manual_time", 1, real=block / 4),
         )
         self.assertEqual([line[0] for line in table.lines], ["9", "31"])
@@ -175,13 +176,13 @@ class Goals(unittest.TestCase):
             + runs("Mac/plain/1024/73", 90.0)
             + runs("Mac/avx2/1024/73", 10.0)
         )
-        figure, text, verdict, where = row.result(results.collect(entries))
+        figure, text, verdict, where = row.result(results.collect(entries), [])
         self.assertEqual((figure, text, verdict, where), (8.0, "8 x", "yes", "256/16"))
         # A short ring is not asked for.
         entries += runs("Mac/plain/256/1", 10.0) + runs("Mac/avx2/256/1", 10.0)
-        self.assertEqual(row.result(results.collect(entries))[3], "256/16")
+        self.assertEqual(row.result(results.collect(entries), [])[3], "256/16")
         entries += runs("Mac/plain/1024/216", 69.0) + runs("Mac/avx2/1024/216", 10.0)
-        figure, _, verdict, where = row.result(results.collect(entries))
+        figure, _, verdict, where = row.result(results.collect(entries), [])
         self.assertEqual((figure, verdict, where), (6.9, "NO", "1024/216"))
 
     def test_a_target_just_reached_is_met_from_either_side(self):
@@ -189,12 +190,12 @@ class Goals(unittest.TestCase):
         for time, verdict in ((1500.0, "yes"), (1501.0, "NO")):
             entries = runs("Source/tessaly/hall/moving/1/1024", time)
             entries += runs("Source/tessaly/hall/still/1/1024", 1000.0)
-            self.assertEqual(moving.result(results.collect(entries))[2], verdict)
+            self.assertEqual(moving.result(results.collect(entries), [])[2], verdict)
         before = goal("moving source, hall of N 216, B 1024", "the earlier library")
         for time, verdict in ((6000.0, "yes"), (5999.0, "NO")):
             entries = runs("Source/against/longest/moving/1/1024", time)
             entries += runs("Source/tessaly/longest/moving/1/1024", 1000.0)
-            self.assertEqual(before.result(results.collect(entries))[2], verdict)
+            self.assertEqual(before.result(results.collect(entries), [])[2], verdict)
 
     def test_silence_is_told_in_percent_of_its_worst_room(self):
         entries = []
@@ -202,25 +203,37 @@ class Goals(unittest.TestCase):
             entries += runs(f"Source/tessaly/{room}/silent/1/256", silent)
             entries += runs(f"Source/tessaly/{room}/still/1/256", 1000.0)
         row = goal("silent source, each room, B 256 and 1024")
-        self.assertEqual(row.result(results.collect(entries)), (0.06, "6 %", "NO", "hall/256"))
+        self.assertEqual(row.result(results.collect(entries), []), (0.06, "6 %", "NO", "hall/256"))
 
     def test_the_widest_table_that_ran_is_judged(self):
         row = goal("convolver, still, 81533 and 220245 taps")
         entries = runs("Convolver/zita_uniform/still/256/81533", 100.0)
         entries += runs("Convolver/tessaly_sse2/still/256/81533", 80.0)
-        self.assertEqual(row.result(results.collect(entries))[0], 1.25)
+        self.assertEqual(row.result(results.collect(entries), [])[0], 1.25)
         entries += runs("Convolver/tessaly_avx2/still/256/81533", 50.0)
-        self.assertEqual(row.result(results.collect(entries))[0], 2.0)
+        self.assertEqual(row.result(results.collect(entries), [])[0], 2.0)
+
+    def test_four_lanes_are_those_of_either_processor(self):
+        for width in ("sse2", "neon"):
+            entries = runs("Transform/fftw/512", 7.0) + runs(f"Transform/tessaly_{width}/512", 10.0)
+            result = goal("same, 4 lanes").result(results.collect(entries), [])
+            self.assertEqual(result, (0.7, "0.7 x", "yes", "512"))
 
     def test_a_row_without_figures_is_neither_met_nor_missed(self):
-        figure, text, verdict, where = goal("same, 4 lanes").result({})
-        self.assertEqual((figure, verdict, where), (None, "-", ""))
-        self.assertTrue(text)
-        self.assertEqual({entry["met"] for entry in goals.goal_records({})}, {None})
+        result = goal("same, 4 lanes").result({}, ["sse2"])
+        self.assertEqual(result, (None, "no rows", "-", ""))
+        self.assertEqual({entry["met"] for entry in goals.goal_records({}, ["sse2"])}, {None})
 
-    def test_what_no_row_can_tell_here_is_said(self):
-        text = goal("same, AVX-512", "FFTW, measured plans").result({})[1]
-        self.assertEqual(text, "not measurable here")
+    def test_not_measurable_is_only_what_the_processor_cannot_do(self):
+        row = goal("same, AVX-512", "FFTW, measured plans")
+        for instructions, text in (
+            (["sse2", "avx2", "fma"], "not measurable here"),
+            (["sse2", "avx2", "fma", "avx512f", "avx512vl"], "no rows"),
+            ([], "no rows"),
+        ):
+            self.assertEqual(row.result({}, instructions)[1], text)
+        before = goal("moving source, hall of N 216, B 1024", "the earlier library")
+        self.assertEqual(before.result({}, ["sse2"])[1], "no rows (--against)")
 
 
 class Pages(unittest.TestCase):
@@ -232,6 +245,13 @@ class Pages(unittest.TestCase):
     def test_a_new_file_has_the_marks_and_the_text(self):
         pages.write_markdown(self.path, "figures")
         self.assertEqual(self.path.read_text(), f"{pages.BEGIN}\n\nfigures\n\n{pages.END}\n")
+
+    def test_a_file_without_both_marks_stays_as_it_is(self):
+        for text in ("mine\n", f"mine\n{pages.BEGIN}\n", f"{pages.END}\n{pages.BEGIN}\n", ""):
+            self.path.write_text(text)
+            with self.assertRaisesRegex(ValueError, "page.md has no lines"):
+                pages.write_markdown(self.path, "figures")
+            self.assertEqual(self.path.read_text(), text)
 
     def test_only_what_stands_between_the_marks_is_replaced(self):
         self.path.write_text(f"before\n{pages.BEGIN}\nold\n{pages.END}\nafter\n")
