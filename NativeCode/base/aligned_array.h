@@ -3,6 +3,7 @@
 
 #include <cstddef>
 #include <cstring>
+#include <limits>
 #include <new>
 #include <type_traits>
 #include <utility>
@@ -28,13 +29,13 @@ public:
     /// @throws std::bad_alloc
     explicit AlignedArray(std::size_t size) : size_(size) {
         if (size_ > 0) {
-            take(allocateZeroed(size_ * sizeof(T)));
+            take(fits() ? allocateZeroed(size_ * sizeof(T)) : nullptr);
         }
     }
     /// Without values. @throws std::bad_alloc
     AlignedArray(std::size_t size, ForOverwrite) : size_(size) {
         if (size_ > 0) {
-            take(allocateForOverwrite(size_ * sizeof(T)));
+            take(fits() ? allocateForOverwrite(size_ * sizeof(T)) : nullptr);
         }
     }
     AlignedArray(AlignedArray&& other) noexcept
@@ -70,6 +71,9 @@ public:
     }
 
 private:
+    bool fits() const noexcept {
+        return size_ <= std::numeric_limits<std::size_t>::max() / sizeof(T);
+    }
     void take(void* memory) {
         if (memory == nullptr) {
             throw std::bad_alloc();

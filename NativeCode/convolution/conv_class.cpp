@@ -4,6 +4,7 @@
 #include <algorithm>
 #include <bit>
 #include <cstring>
+#include <new>
 #include <utility>
 
 #include "base/ess_error.h"
@@ -215,17 +216,22 @@ void convClass::watch(FirNotes* notes, std::int32_t compared) {
 }
 
 void convClass::splitFarTail(std::int32_t ratio) {
-    auto far = std::make_unique<FarTail>();
-    const auto count = static_cast<std::size_t>(FDLtoBUFConv);
-    if (isSecondInstance != 0 || directFilterFeed != 0 ||
-        !far->prepare(*kernels_, blockLength, count, ratio)) {
+    if (isSecondInstance != 0 || directFilterFeed != 0) {
         return;
     }
-    // Where more than that is to be made up for, the uniform sum is no dearer.
-    const std::size_t corrections = (count - far->firstPartition()) / 4 + 1;
-    farHeld_.reserve(corrections);
-    farExpected_.reserve(corrections);
-    far_ = std::move(far);
+    try {
+        auto far = std::make_unique<FarTail>();
+        const auto count = static_cast<std::size_t>(FDLtoBUFConv);
+        if (far->prepare(*kernels_, blockLength, count, ratio)) {
+            // Where more than that is to be made up for, the uniform sum is no dearer.
+            const std::size_t corrections = (count - far->firstPartition()) / 4 + 1;
+            farHeld_.reserve(corrections);
+            farExpected_.reserve(corrections);
+            far_ = std::move(far);
+        }
+    } catch (const std::bad_alloc&) {
+        logTrace("no memory for larger partitions, all of the response stays in short ones");
+    }
 }
 
 void convClass::clearFDL() noexcept {

@@ -36,11 +36,12 @@ public:
     /// part: near part and far part cost about the same.
     static std::int32_t ratioFor(std::int32_t partitions, std::int32_t early) noexcept;
 
-    /// Load time: allocates, some 12 bytes a sample of the far part.
+    /// Load time: allocates 24 bytes for each frame of the far part, and 48 for each of L more.
     /// @param blockLength  B
     /// @param partitions   N, of B samples each; more than 2 * `ratio`
     /// @param ratio        R, a power of two from 4
-    /// @return false, and `essError` as it was, without memory or with other sizes
+    /// @return false, and `essError` as it was, without memory for spectra or with other sizes
+    /// @throws std::bad_alloc without memory for samples
     bool prepare(const Kernels& kernels,
                  std::int32_t blockLength,
                  std::size_t partitions,

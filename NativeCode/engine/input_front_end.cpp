@@ -49,9 +49,9 @@ bool isAtRest(const Biquad& filter) noexcept {
 }
 
 /// As allZero, for one channel of stereo frames.
-bool isSilent(const float* channel, int frames) noexcept {
+bool channelSilent(const float* channel, int frames) noexcept {
     // Both channels mostly are, and side by side they are looked through faster.
-    if (frames > 0 && tessaly::isSilent(channel, 2 * static_cast<std::size_t>(frames) - 1)) {
+    if (frames > 0 && isSilent(channel, 2 * static_cast<std::size_t>(frames) - 1)) {
         return true;
     }
     constexpr int together = 16;  // frames between two looks at the result
@@ -139,7 +139,7 @@ void InputFrontEnd::prepareWindow(int blocklenght) {
 }
 
 bool InputFrontEnd::staysAtRest(const float* channel, bool bassBoost, bool dopplerOn) noexcept {
-    return !dopplerOn && chainOf(*this, bassBoost).isAtRest() && isSilent(channel, blocklenght_);
+    return !dopplerOn && chainOf(*this, bassBoost).isAtRest() && channelSilent(channel, blocklenght_);
 }
 
 bool InputFrontEnd::seesSilence(const float* input,

@@ -191,8 +191,7 @@ void InstanceHandler::renderBlock(
         return;
     }
     if (out != nullptr && outchannels == 2 && length == blockCapacity) {
-        // A whole block needs no copy. The input is out of the engine's way, also where the host
-        // has one buffer for both.
+        // A whole block needs no copy: the engine has taken its input before it writes.
         float* target = out;
         engine->comProcessing(inputBlock, target, activeInstance);
         return;

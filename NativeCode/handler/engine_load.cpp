@@ -1,6 +1,7 @@
 // Builds an engine for a handler, swaps it in and deletes the one before.
 #include <algorithm>
 #include <limits>
+#include <new>
 
 #include "base/ess_error.h"
 #include "base/log.h"
@@ -51,10 +52,17 @@ void InstanceHandler::loadEngine(int hostSampleRate, int hostBuffersize) {
     // While both engines live the new one shares the HRIR set and leaves headphone and ambience
     // to the old one.
     const auto next = static_cast<std::size_t>(nextInstance);
-    instance[next] = std::make_unique<SpatialEngine>(
-        "essCore_InstanceForUnity", bundleBasePath, wrapToInt16(blocklenght), &azimuthCell,
-        &elevationCell, &distanceCell, &gainCell, qualityValue, &engineSettings, &mixParameters,
-        nextInstance);
+    try {
+        instance[next] = std::make_unique<SpatialEngine>(
+            "essCore_InstanceForUnity", bundleBasePath, wrapToInt16(blocklenght), &azimuthCell,
+            &elevationCell, &distanceCell, &gainCell, qualityValue, &engineSettings, &mixParameters,
+            nextInstance);
+    } catch (const std::bad_alloc&) {
+        // No exception leaves the library.
+        essError = essErrorSpectrumMemory;
+        logError("Tessaly_h: ERROR code ", essError);
+        return;
+    }
     activeInstance = nextInstance;
 
     if (essError >= 0) {
@@ -149,8 +157,16 @@ void InstanceHandler::allocateBlocks() {
     // length: such a handler gets no blocks and stays silent.
     const bool fits = blocklenght > 0 && blocklenght <= std::numeric_limits<std::int16_t>::max();
     blockCapacity = fits ? static_cast<std::uint32_t>(blocklenght) : 0;
-    inputStorage = AlignedArray<float>(2 * static_cast<std::size_t>(blockCapacity));
-    outputStorage = AlignedArray<float>(2 * static_cast<std::size_t>(blockCapacity));
+    try {
+        const std::size_t floats = 2 * static_cast<std::size_t>(blockCapacity);
+        inputStorage = AlignedArray<float>(floats);
+        outputStorage = AlignedArray<float>(floats);
+    } catch (const std::bad_alloc&) {
+        inputStorage = {};
+        outputStorage = {};
+        blockCapacity = 0;
+        essError = essErrorSpectrumMemory;
+    }
     inputBlock = inputStorage.data();
     outputBlock = outputStorage.data();
     inputBlockSilent_ = true;
