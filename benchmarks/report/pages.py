@@ -25,8 +25,8 @@ def conditions(content):
 
 HOW_TO_READ = [
     "In brackets: how many times as fast as the reference, which is 1.00; more is faster.",
-    f"~ marks figures whose middle half of repetitions spans more than {200 * UNSTEADY:.0f} % of their "
-    "median: run again on a quiet machine.",
+    f"~ marks figures whose middle half of repetitions spans more than {200 * UNSTEADY:.0f} % of "
+    "their median: run again on a quiet machine.",
 ]
 
 
