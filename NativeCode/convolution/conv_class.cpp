@@ -135,7 +135,6 @@ convClass::convClass(std::string instanceNameIn,
       FDLtoBUFConv(std::max<std::int16_t>(partitions, 1)),
       partitionsAtCreation(FDLtoBUFConv),
       stride_(spectrumStride(blockLengthIn + 1)) {
-    ++convInstanceCount;
     FDLpos = static_cast<std::int16_t>(FDLtoBUFConv - 1);
     // One accuracy serves all vector operations, so the mode is the choice of instruction set.
     kernels_ = &selectKernels();
@@ -150,21 +149,22 @@ convClass::convClass(std::string instanceNameIn,
     FDLown.resize(count);
     filterPartsL.resize(count);
     filterPartsR.resize(count);
-    carveSpectra(FDL, ringMemory_, stride_);
-    if (isSecondInstance == 0) {
-        FDLown = FDL;
-        carveSpectra(filterPartsL, partsMemoryL_, stride_);
-        carveSpectra(filterPartsR, partsMemoryR_, stride_);
-    }
-    allocSpectrum(accumL, binCount);
-    allocSpectrum(accumR, binCount);
-    sums_.prepare(*kernels_, binCount, count);
-    allocSpectrum(end_.left, binCount);
-    allocSpectrum(end_.right, binCount);
-    scaled_.begin = count;
     changed_.resize(count);
     silent_.resize(count);
     ring_.prepare(count);
+    sums_.prepare(*kernels_, binCount, count);
+    // From here on nothing throws: these have no owner that would release them.
+    carveSpectra(FDL, ringMemory_, stride_);
+    if (isSecondInstance == 0) {
+        std::copy(FDL.begin(), FDL.end(), FDLown.begin());
+        carveSpectra(filterPartsL, partsMemoryL_, stride_);
+        carveSpectra(filterPartsR, partsMemoryR_, stride_);
+    }
+    for (ComplexBin** const spectrum : {&accumL, &accumR, &end_.left, &end_.right}) {
+        allocSpectrum(*spectrum, binCount);
+    }
+    scaled_.begin = count;
+    ++convInstanceCount;
 
     dftiStatus = createFFT(fftHandle, fftLength);
     dftiStatus = createFFT(ifftHandle, fftLength);

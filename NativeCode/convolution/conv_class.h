@@ -40,7 +40,7 @@ void resetConvolutionState() noexcept;
 ///
 /// With a second instance the engine lets it borrow `filterPartsL`, `filterPartsR`,
 /// `hpTFspectrumL` and `hpTFspectrumR` of the first one, entry by entry; it neither writes nor
-/// releases them, and does not run after the first one is gone.
+/// releases them. After `processCrossfade` neither runs once the other one is gone.
 // The fields keep this order, whatever padding it costs.
 // NOLINTNEXTLINE(clang-analyzer-optin.performance.Padding)
 class convClass {

@@ -148,7 +148,10 @@ void convClass::advanceFarTail(bool silent) noexcept {
     const float* const right = copied ? timeMemoryR_.data() : firR;
     const auto near = static_cast<std::int32_t>(far_->firstPartition()) * blockLength;
     if (!copied && notes_ != nullptr && notes_->written.hull().end > near) {
-        far_->responseChanged();  // written, but not taken yet
+        // Written, but not taken yet.
+        far_->responseChanged();
+        far_->advance(input, silent, false, nullptr, nullptr);
+        return;
     }
     far_->advance(input, silent, standsBeforeFar(scaled_), left, right);
 }

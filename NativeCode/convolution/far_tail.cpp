@@ -23,7 +23,11 @@ constexpr std::int32_t phasesWithoutSums = 3;  // input transform and one backwa
 class KeptError {
 public:
     KeptError() noexcept : kept_(essError) {}
-    ~KeptError() { essError = kept_; }
+    ~KeptError() {
+        if (essError == essErrorSpectrumMemory) {
+            essError = kept_;
+        }
+    }
     KeptError(const KeptError&) = delete;
     KeptError& operator=(const KeptError&) = delete;
 
@@ -154,7 +158,7 @@ void FarTail::advance(
     }
     ++blocks_;
     silentBlocks_[blocks_ % silentBlocks_.size()] = silent ? 1 : 0;
-    if (built_ < ears * parts_) {
+    if (built_ < ears * parts_ && left != nullptr && right != nullptr) {
         buildNext(left, right);
     } else if (computing_ && phase > 0) {
         const std::int32_t back = phase - (ratio_ - static_cast<std::int32_t>(ears));

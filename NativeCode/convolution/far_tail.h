@@ -56,7 +56,9 @@ public:
     /// @param window  2B samples, the last block's and the new ones
     /// @param silent  the window is known to be zeros
     /// @param wanted  results can be heard; else none is made
-    /// @param left, right  the response, `partitions` * B samples each, without the gain of its end
+    /// @param left, right  the response, `partitions` * B samples each, without the gain of its
+    /// end;
+    ///                     null while it is not to be read
     void advance(const float* window,
                  bool silent,
                  bool wanted,

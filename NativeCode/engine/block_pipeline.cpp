@@ -196,6 +196,9 @@ void processEngineBlock(EngineState& state, float*& input, float*& output) {
         renderNothing(state, output);
         return;
     }
+    if (output == nullptr) {
+        return;
+    }
     state.inBlock = input;
     state.outBlock = output;
     state.inputChannel = 0;

@@ -240,7 +240,12 @@ int earlyPartitions(const EngineState& state) {
          ++k) {
         last = std::max<int>(last, reflections.records[static_cast<std::size_t>(k)].delaySamples);
     }
-    return (last + state.switches.hrirLength) / state.sizes.blocklenght + 2;
+    last += state.switches.hrirLength;
+    if (state.switches.qvEarlyReflections) {
+        last = std::max({last, reflections.earlyRefDelay_1st + reflections.earlyRefLength_1st,
+                         reflections.earlyRefDelay_2nd + reflections.earlyRefLength_2nd});
+    }
+    return last / state.sizes.blocklenght + 2;
 }
 
 bool buildConvolvers(EngineState& state) {
@@ -324,12 +329,12 @@ SpatialEngine::SpatialEngine(std::string instanceName,
     state.instanceName = std::move(instanceName);
     state.bundleBasePath = std::move(bundleBasePath);
     state.handlerSlot = handlerSlot;
+    state.sizes.blocklenght = blocklenght;
+    state.qualityValue = qualityValue;
+    state.settings = *settings;  // may throw: only then is the engine counted
     state.instanceNumber = wrapToInt16(engineCount);
     ++engineCount;
     blockCounter = 0;
-    state.sizes.blocklenght = blocklenght;
-    state.qualityValue = qualityValue;
-    state.settings = *settings;
     state.liveSettings = settings;
     state.mixParameters = mixParameters;
     state.phiIn = phiIn;

@@ -139,7 +139,8 @@ void InputFrontEnd::prepareWindow(int blocklenght) {
 }
 
 bool InputFrontEnd::staysAtRest(const float* channel, bool bassBoost, bool dopplerOn) noexcept {
-    return !dopplerOn && chainOf(*this, bassBoost).isAtRest() && channelSilent(channel, blocklenght_);
+    return !dopplerOn && chainOf(*this, bassBoost).isAtRest() &&
+           channelSilent(channel, blocklenght_);
 }
 
 bool InputFrontEnd::seesSilence(const float* input,

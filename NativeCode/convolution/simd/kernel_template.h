@@ -598,7 +598,8 @@ void backwardMiddleLanes(const TransformTables& tables,
                          float* work,
                          std::size_t samples) {
     constexpr Index count = Lanes::count;
-    const Index rows = (static_cast<Index>(samples) + 1) / 2;
+    // Whole lanes of them, which the pass across reads.
+    const Index rows = ((static_cast<Index>(samples) + 1) / 2 + count - 1) / count * count;
     if (count == 1 || rows > tables.columns) {
         return backwardLanes<Lanes>(tables, bins, output, work);
     }
@@ -606,7 +607,7 @@ void backwardMiddleLanes(const TransformTables& tables,
         transformColumns<Lanes>(tables, BinSource<Lanes>(tables, bins), work, output,
                                 WantedRows{rows});
         const Index middle = tables.points;
-        acrossRows<Lanes>(tables, work, (rows + count - 1) / count,
+        acrossRows<Lanes>(tables, work, rows / count,
                           [&](Index k0, const Complex<Lanes>(&x)[count]) {
                               SampleSink<Lanes>{output + middle}(k0, x[count / 2]);
                           });
@@ -624,10 +625,11 @@ void backwardBlockLanes(const TransformTables& tables,
     constexpr Index count = Lanes::count;
     transformColumns<Lanes>(tables, BinSource<Lanes>(tables, bins), work, scratch,
                             WantedRows{tables.columns});
-    const SampleSink<Lanes> sink{output - tables.points};
+    const SampleSink<Lanes> sink{output};
+    const Index middle = tables.points / 2;
     if constexpr (count == 1) {
-        for (Index k = tables.points / 2; k < tables.points; ++k) {
-            sink(k, loadGroup<Lanes>(work, k));
+        for (Index k = middle; k < tables.points; ++k) {
+            sink(k - middle, loadGroup<Lanes>(work, k));
         }
     } else {
         const Index columns = tables.columns;
@@ -635,7 +637,7 @@ void backwardBlockLanes(const TransformTables& tables,
                           [&](Index k0, const Complex<Lanes>(&x)[count]) {
                               TESSALY_KERNEL_UNROLL
                               for (Index d = count / 2; d < count; ++d) {
-                                  sink(k0 + columns * d, x[d]);
+                                  sink(k0 + columns * d - middle, x[d]);
                               }
                           });
     }
