@@ -3,14 +3,12 @@
 
 #include <algorithm>
 #include <bit>
-#include <cstring>
 #include <new>
 #include <utility>
 
 #include "base/ess_error.h"
 #include "base/log.h"
 #include "base/process_lifetime.h"
-#include "base/silence.h"
 #include "convolution/simd/kernels.h"
 #include "convolution/spectrum_stride.h"
 

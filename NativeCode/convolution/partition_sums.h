@@ -42,7 +42,6 @@ public:
             ++count_;
         }
     }
-    bool empty() const noexcept { return count_ == 0; }
 
     /// sum = products of the pairs. Without a pair nothing is written. Block time.
     /// @return whether there was one

@@ -431,5 +431,35 @@ TEST_F(EngineRooms, ThreeHundredRoomChangesInThreeHundredBlocks) {
     EXPECT_EQ(engineCount, 0);
 }
 
+// ---- The far tail ----
+
+TEST_F(EngineRooms, LongTailsAreHeardInLargerPartitionsBehindTheReflections) {
+    // A concert hall, of 290 blocks, whose last reflection comes after 8600 frames.
+    constexpr int hall = 16;
+    writeData(48000, {hall});
+    const auto rig = built(48000, 256, hall, hall);
+    ASSERT_GT(rig->state().sizes.fdlCount, FarTail::fewestPartitions);
+    std::fill(rig->input.begin(), rig->input.end(), 0.25f);
+    int far = 0;
+    for (int n = 0; n < 120; ++n) {
+        rig->azimuth = static_cast<std::int16_t>(n % 90);
+        rig->run();
+        far += rig->state().firstOLS->farTailHeard() ? 1 : 0;
+    }
+    EXPECT_GT(far, 20);
+}
+
+TEST_F(EngineRooms, ShortTailsStayInPartitionsOfABlock) {
+    constexpr int smallRoom = 20;
+    writeData(48000, {smallRoom});
+    const auto rig = built(48000, 1024, smallRoom, smallRoom);
+    ASSERT_LT(rig->state().sizes.fdlCount, FarTail::fewestPartitions);
+    std::fill(rig->input.begin(), rig->input.end(), 0.25f);
+    for (int n = 0; n < 40; ++n) {
+        rig->run();
+        EXPECT_FALSE(rig->state().firstOLS->farTailHeard());
+    }
+}
+
 }  // namespace
 }  // namespace tessaly::test

@@ -225,5 +225,29 @@ INSTANTIATE_TEST_SUITE_P(Tables,
                              return availableKernels().tables[tested.param]->name;
                          });
 
+TEST(InputFrontEndAhead, SeesSilenceOnlyOnceTheWholeWindowIsSilent) {
+    const LogCapture quiet;
+    InputFrontEnd frontEnd;
+    frontEnd.prepareFilters(48000);
+    frontEnd.prepareWindow(16);
+    for (Biquad* const filter : {&frontEnd.highCutFilter, &frontEnd.lowCutFilter,
+                                 &frontEnd.bassShelveFilter, &frontEnd.inputLowPass}) {
+        filter->clear();
+    }
+    frontEnd.inputHistory[20] = 1.0f;  // of the block before, which moves to the lower half
+    const std::vector<float> silence(32);
+    const auto play = [&] {
+        const bool seen = frontEnd.seesSilence(silence.data(), 0, false, false);
+        frontEnd.process(silence.data(), 0, false, false, 1.0f, 1.0f);
+        const bool zeros = std::all_of(frontEnd.inputHistory, frontEnd.inputHistory + 32,
+                                       [](float sample) { return sample == 0.0f; });
+        EXPECT_TRUE(!seen || zeros);
+        return seen;
+    };
+    EXPECT_FALSE(play());
+    EXPECT_TRUE(play());
+    EXPECT_FALSE(frontEnd.seesSilence(silence.data(), 0, false, true)) << "a delay line may sound";
+}
+
 }  // namespace
 }  // namespace tessaly::test
