@@ -8,6 +8,7 @@
 namespace tessaly {
 
 float* convClass::process() noexcept {
+    followCompensation();
     watchSelection();
     // In a crossfade block the first instance works on the spectrum that the second one made.
     const bool borrowed = secondOLSactive && isSecondInstance == 0;
@@ -17,7 +18,7 @@ float* convClass::process() noexcept {
     }
     advanceFarTail(silent);
     const RingView ring = borrowed ? RingView{FDL, nullptr, newestSlot()} : ownRing();
-    render(ring, partner_ != nullptr ? partner_->ownRing() : ring, Extent::Window);
+    render(ring, partner_ != nullptr ? partner_->ownRing() : ring);
     return outputL;
 }
 
@@ -38,10 +39,39 @@ bool convClass::takeInput(std::uint64_t block) noexcept {
         }
         dftiStatus = transformOk;
     } else {
-        dftiStatus = FFT(input, spectrum, fftHandle);
+        dftiStatus = transformWindow(input, spectrum);
     }
     ring_.set(slot, silent, dftiStatus == transformOk ? block : InputRing::noBlock);
     return silent;
+}
+
+std::size_t convClass::bins() const noexcept {
+    return static_cast<std::size_t>(naturalOrder_ ? binCount : blockLength);
+}
+
+std::int32_t convClass::transformWindow(const float* samples, ComplexBin* spectrum) noexcept {
+    return naturalOrder_ ? FFT(samples, spectrum, fftHandle)
+                         : windowFFT(samples, spectrum, fftHandle);
+}
+
+std::int32_t convClass::transformPartition(const float* samples, ComplexBin* spectrum) noexcept {
+    if (!naturalOrder_) {
+        return partitionFFT(samples, spectrum, fftHandle);
+    }
+    std::copy_n(samples, blockLength, padded_.data());
+    return FFT(padded_.data(), spectrum, fftHandle);
+}
+
+/// The first `samples` of the block at least, of both ears.
+void convClass::transformBack(std::int32_t samples) noexcept {
+    const auto back = [&](const ComplexBin* sum, float* output) noexcept {
+        if (naturalOrder_ || output == nullptr) {
+            return IFFT(sum, output, ifftHandle);
+        }
+        return blockIFFT(sum, output + blockLength, samples, ifftHandle);
+    };
+    dftiStatus = back(accumL, outputL);
+    dftiStatus = back(accumR, outputR);
 }
 
 convClass::RingView convClass::ownRing() const noexcept {
@@ -66,7 +96,7 @@ bool convClass::canSum(const RingView& ring, bool compensated) const noexcept {
 }
 
 /// One block from a ring with the spectra as they stand.
-void convClass::render(const RingView& ring, const RingView& other, Extent extent) noexcept {
+void convClass::render(const RingView& ring, const RingView& other) noexcept {
     const bool compensated = hpTFactive && FDLtoBUFConv == 1;
     farHeard_ = false;
     if (ring.state != nullptr && ring.state->silent() && ifftHandle != nullptr) {
@@ -98,17 +128,11 @@ void convClass::render(const RingView& ring, const RingView& other, Extent exten
         sums_.addTo(accumulators(), layout.gain);
         subtractFarExpected(accumulators(), layout.gain);
     }
-    transformBack(extent);
+    transformBack(blockLength);
     if (farHeard_) {
         far_->addTo(outputL + blockLength, outputR + blockLength, layoutOf(scaled_).gain,
                     blockLength);
     }
-}
-
-void convClass::transformBack(Extent extent) noexcept {
-    const auto back = extent == Extent::Block ? blockIFFT : IFFT;
-    dftiStatus = back(accumL, outputL, ifftHandle);
-    dftiStatus = back(accumR, outputR, ifftHandle);
 }
 
 /// The results of a silent block are still there in the next one.
@@ -251,6 +275,10 @@ bool convClass::sharesWith(const convClass& second) noexcept {
 }
 
 void convClass::processCrossfade(convClass& second, std::int32_t heardOfOld) noexcept {
+    followCompensation();
+    if (naturalOrder_ && !second.naturalOrder_) {
+        second.useNaturalOrder();  // it has slept while compensation came and went
+    }
     if (!sharesWith(second)) {
         borrowAndProcess(second);
         return;
@@ -283,7 +311,7 @@ void convClass::processCrossfade(convClass& second, std::int32_t heardOfOld) noe
         changedCount_ = 0;
     }
     if (ring.state->silent() || (changedCount_ == 0 && before == scaled_)) {
-        render(ring, ownRing(), Extent::Block);
+        render(ring, ownRing());
         std::copy_n(outputL + blockLength, heard, second.outputL + blockLength);
         std::copy_n(outputR + blockLength, heard, second.outputR + blockLength);
         if (byTaps && !ring.state->silent()) {
@@ -331,12 +359,13 @@ void convClass::renderBoth(convClass& second,
         subtractFarExpected(end_, 1.0f);
         hasEnd = true;
     }
-    const auto bins = static_cast<std::size_t>(binCount);
-    std::copy_n(accumL, bins, second.accumL);
-    std::copy_n(accumR, bins, second.accumR);
+    if (hasEnd && old.gain == now.gain) {
+        sums_.addScaled(end_, now.gain, accumulators());
+        hasEnd = false;
+    }
     const auto addOwn = [&](const Layout& layout, const EarSpectra& sum) {
         collect(ring, 0, layout.scaledBegin, touched);
-        sums_.addTo(sum);
+        sums_.store(accumulators(), sum);
         collect(ring, layout.scaledBegin, layout.end, touched);
         sums_.addTo(sum, layout.gain);
         if (hasEnd) {
@@ -345,11 +374,10 @@ void convClass::renderBoth(convClass& second,
     };
 
     addOwn(old, second.accumulators());
-    second.dftiStatus = middleIFFT(second.accumL, second.outputL, heard, second.ifftHandle);
-    second.dftiStatus = middleIFFT(second.accumR, second.outputR, heard, second.ifftHandle);
+    second.transformBack(heard);
     transformChanged();
     addOwn(now, accumulators());
-    transformBack(Extent::Block);
+    transformBack(blockLength);
     if (farHeard_) {
         far_->addTo(second.outputL + blockLength, second.outputR + blockLength, old.gain, heard);
         far_->addTo(outputL + blockLength, outputR + blockLength, now.gain, blockLength);

@@ -150,7 +150,11 @@ convClass::convClass(std::string instanceNameIn,
     changed_.resize(count);
     silent_.resize(count);
     ring_.prepare(count);
-    sums_.prepare(*kernels_, binCount, count);
+    const bool alsoNaturalOrder = count == 1 || directFilterFeed != 0;
+    sums_.prepare(*kernels_, blockLength, count, alsoNaturalOrder);
+    if (alsoNaturalOrder) {
+        padded_ = AlignedArray<float>(2 * static_cast<std::size_t>(std::max(blockLength, 0)));
+    }
     // From here on nothing throws: these have no owner that would release them.
     carveSpectra(FDL, ringMemory_, stride_);
     if (isSecondInstance == 0) {
@@ -168,6 +172,9 @@ convClass::convClass(std::string instanceNameIn,
     dftiStatus = createFFT(ifftHandle, fftLength);
     if (fftHandle == nullptr) {
         essError = essErrorTransformPlan;
+    }
+    if (directFilterFeed != 0) {
+        useNaturalOrder();
     }
     if (hpTFactive) {
         HpTF_Freq();
@@ -230,6 +237,33 @@ void convClass::splitFarTail(std::int32_t ratio) {
     } catch (const std::bad_alloc&) {
         logTrace("no memory for larger partitions, all of the response stays in short ones");
     }
+}
+
+void convClass::useNaturalOrder() noexcept {
+    naturalOrder_ = true;
+    sums_.useNaturalOrder();
+}
+
+/// The product of a response and a compensation filter is longer than a block, and what it wraps is
+/// heard: from the first block with compensation of one partition on, spectra are those of whole
+/// windows. The ring's only slot is written again in every block.
+void convClass::followCompensation() noexcept {
+    if (naturalOrder_ || !hpTFactive || FDLtoBUFConv != 1) {
+        return;
+    }
+    useNaturalOrder();
+    if (isSecondInstance != 0) {
+        return;
+    }
+    const auto take = [this](const float* kept, const float* fir, ComplexBin* spectrum) noexcept {
+        const float* const samples = kept != nullptr ? kept : fir;
+        if (samples != nullptr && spectrum != nullptr && firBufferSize >= blockLength &&
+            silent_[0] == 0) {
+            dftiStatus = transformPartition(samples, spectrum);
+        }
+    };
+    take(timePartsL[0], firL, filterPartsL[0]);
+    take(timePartsR[0], firR, filterPartsR[0]);
 }
 
 void convClass::clearFDL() noexcept {

@@ -34,9 +34,14 @@ extern constinit std::int32_t hpTFtimeLength;
 void resetConvolutionState() noexcept;
 
 /// Uniformly partitioned convolution with two impulse responses that may change at any block.
-/// The impulse response is N partitions of one block length B, each held as a spectrum of B+1
-/// bins; the input is a ring of N spectra (`FDL`). The class owns no policy: it reads the engine's
-/// buffers and flags by reference, and the engine moves `FDLpos` and swaps `FDL`.
+/// The impulse response is N partitions of one block length B, each held as a spectrum; the input
+/// is a ring of N spectra (`FDL`). The class owns no policy: it reads the engine's buffers and
+/// flags by reference, and the engine moves `FDLpos` and swaps `FDL`.
+///
+/// Spectra are block spectra: B bins in the kernels' own order, enough for the half of a result
+/// that is heard (spectral_primitives.h). Where the other half matters, with `directFilterFeed` and
+/// with headphone compensation of one partition, they are B+1 bins in natural order. There is room
+/// for these in each.
 ///
 /// With a second instance the engine lets it borrow `filterPartsL`, `filterPartsR`,
 /// `hpTFspectrumL` and `hpTFspectrumR` of the first one, entry by entry; it neither writes nor
@@ -88,8 +93,9 @@ public:
     convClass(const convClass&) = delete;
     convClass& operator=(const convClass&) = delete;
 
-    /// One block. The result is samples B to 2B - 1 of `outputL` and `outputR`, times 2B. Block
-    /// time; a changed headphone selection allocates, a refused transform logs.
+    /// One block. The result is samples B to 2B - 1 of `outputL` and `outputR`, times 2B; those
+    /// before are undefined. Block time; a changed headphone selection allocates, a refused
+    /// transform logs.
     /// @return `outputL`
     float* process() noexcept;
 
@@ -97,8 +103,8 @@ public:
     /// its ring and renders with the spectra as they stand, then this one updates them and renders
     /// the same ring; its own ring stays as it is, newest slot included. The sum over partitions
     /// that no update touches is made once for both; without any, the second's result is a copy of
-    /// this one's. Of the second's block only the first `heardOfOld` samples are promised, and of
-    /// both nothing before the block. Block time.
+    /// this one's. Of the second's block only the first `heardOfOld` samples are promised. Block
+    /// time.
     void processCrossfade(convClass& second, std::int32_t heardOfOld) noexcept;
 
     /// Who writes the responses tells here which samples, taken and cleared by each update, and
@@ -181,7 +187,7 @@ public:
     std::vector<ComplexBin*> FDLown;  ///< first instance: its own ring, to restore `FDL` from
     std::vector<ComplexBin*> filterPartsL;
     std::vector<ComplexBin*> filterPartsR;
-    ComplexBin* accumL = nullptr;
+    ComplexBin* accumL = nullptr;  ///< result spectra of the current block
     ComplexBin* accumR = nullptr;
     std::int16_t FDLpos = 0;  ///< ring index of the newest spectrum, 0 to N - 1
     std::int16_t FDLtoBUFConv = 1;
@@ -227,14 +233,17 @@ private:
     std::uint64_t blockNumber() const noexcept;
     void advanceFarTail(bool silent) noexcept;
     bool canSum(const RingView& ring, bool compensated) const noexcept;
-    /// What of a result is made: all 2B samples, or those of the block.
-    enum class Extent : std::uint8_t { Window, Block };
-    void render(const RingView& ring, const RingView& other, Extent extent) noexcept;
+    void render(const RingView& ring, const RingView& other) noexcept;
     void renderSilence() noexcept;
     void renderOldByTaps(convClass& second, std::int32_t heard) noexcept;
     void noteStartChange(std::int32_t taps) noexcept;
     void renderBoth(convClass& second, const ScaledPartitions& before, std::int32_t heard) noexcept;
-    void transformBack(Extent extent) noexcept;
+    std::size_t bins() const noexcept;
+    void useNaturalOrder() noexcept;
+    void followCompensation() noexcept;
+    std::int32_t transformWindow(const float* samples, ComplexBin* spectrum) noexcept;
+    std::int32_t transformPartition(const float* samples, ComplexBin* spectrum) noexcept;
+    void transformBack(std::int32_t samples) noexcept;
     /// Partitions [0, scaledBegin) of the uniform sums and [scaledBegin, end), which count `gain`
     /// times, as does the far tail behind them.
     struct Layout {
@@ -276,6 +285,8 @@ private:
     std::vector<FarCorrection> farHeld_;
     std::vector<FarCorrection> farExpected_;
 
+    bool naturalOrder_ = false;   ///< of all spectra; once so, for good
+    AlignedArray<float> padded_;  ///< a partition and B zeros, for natural order
     PartitionSums sums_;
     EarSpectra end_;  ///< sum over the scaled end, without its gain
 

@@ -16,6 +16,7 @@ void convClass::updateFilter() noexcept {
 }
 
 void convClass::takeResponses() noexcept {
+    followCompensation();
     if (directFilterFeed != 0) {
         feedDirectly(firL, timePartsL, filterPartsL);
         feedDirectly(firR, timePartsR, filterPartsR);
@@ -122,7 +123,7 @@ void convClass::transformChanged() noexcept {
         if (kept != nullptr) {
             std::memcpy(kept, fir, length * sizeof(float));
         }
-        dftiStatus = halfFFT(fir, spectrum, fftHandle);
+        dftiStatus = transformPartition(fir, spectrum);
         return allZero(fir, length);
     };
     for (std::size_t i = 0; i < changed_.size(); ++i) {

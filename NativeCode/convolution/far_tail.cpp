@@ -85,13 +85,13 @@ bool FarTail::allocate(std::size_t partitions) {
     }
     allocSpectrum(sum_.left, bins);
     allocSpectrum(sum_.right, bins);
-    createFFT(transform_, static_cast<std::int32_t>(2 * length_));
+    createBlockTransform(transform_, static_cast<std::int32_t>(2 * length_));
     window_ = AlignedArray<float>(2 * length_);
     filling_ = AlignedArray<float>(length_);
     padded_ = AlignedArray<float>(length_);
     for (std::size_t ear = 0; ear < ears; ++ear) {
-        result_[ear] = AlignedArray<float>(2 * length_);
-        next_[ear] = AlignedArray<float>(2 * length_);
+        result_[ear] = AlignedArray<float>(length_);
+        next_[ear] = AlignedArray<float>(length_);
         responses_[ear].resize(parts_);
     }
     inputs_.resize(parts_);
@@ -184,7 +184,7 @@ void FarTail::startRound(bool wanted) noexcept {
     const bool silent = zerosThroughout() || allZero(window_.data(), 2 * length_);
     silentInputs_[newest_] = silent ? 1 : 0;
     if (!silent) {
-        FFT(window_.data(), memory_[inputMemory] + newest_ * stride_, transform_);
+        windowFFT(window_.data(), memory_[inputMemory] + newest_ * stride_, transform_);
     }
 
     computing_ = wanted && built_ == ears * parts_;
@@ -216,7 +216,7 @@ void FarTail::buildNext(const float* left, const float* right) noexcept {
         samples = padded_.data();
     }
     silentParts_[built_] = allZero(samples, length_) ? 1 : 0;
-    halfFFT(samples, memory_[1 + ear] + part * stride_, transform_);
+    partitionFFT(samples, memory_[1 + ear] + part * stride_, transform_);
     ++built_;
 }
 
@@ -226,10 +226,9 @@ void FarTail::sumShare(std::int32_t phase) noexcept {
         return;
     }
     const auto shares = static_cast<std::size_t>(ratio_ - phasesWithoutSums);
-    const std::size_t bins = length_ + 1;
     const auto edge = [&](std::size_t share) {
-        constexpr std::size_t line = 8;  // bins
-        return share == shares ? bins : length_ * share / shares / line * line;
+        constexpr std::size_t rows = 16;  // bins, the most lanes that a spectrum is made with
+        return share == shares ? length_ : length_ * share / shares / rows * rows;
     };
     const auto share = static_cast<std::size_t>(phase);
     const std::size_t begin = edge(share);
@@ -240,13 +239,16 @@ void FarTail::sumShare(std::int32_t phase) noexcept {
         responses_[0][i] += step;
         responses_[1][i] += step;
     }
-    kernels_->listSum(end - begin, pairs_, inputs_.data(), responses_[0].data(),
-                      responses_[1].data(), false, sum_.left + begin, sum_.right + begin);
+    kernels_->sumOfProducts(kernels_->transformLanes(static_cast<std::int32_t>(length_)),
+                            end - begin, pairs_, inputs_.data(), responses_[0].data(),
+                            responses_[1].data(), nullptr, nullptr, sum_.left + begin,
+                            sum_.right + begin);
 }
 
 void FarTail::transformBack(std::size_t ear) noexcept {
     if (pairs_ > 0) {
-        IFFT(ear == 0 ? sum_.left : sum_.right, next_[ear].data(), transform_);
+        blockIFFT(ear == 0 ? sum_.left : sum_.right, next_[ear].data(),
+                  static_cast<std::int32_t>(length_), transform_);
     }
 }
 
@@ -256,17 +258,11 @@ void FarTail::addTo(float* left, float* right, float gain, std::int32_t samples)
     }
     const auto ratio = static_cast<std::uint64_t>(ratio_);
     const auto length = static_cast<std::size_t>(blockLength_);
-    const std::size_t start = length_ + static_cast<std::size_t>((blocks_ - 1) % ratio) * length;
+    const std::size_t start = static_cast<std::size_t>((blocks_ - 1) % ratio) * length;
     const float scale = gain / static_cast<float>(ratio_);  // 2L to 2B
-    const std::int32_t count = std::clamp(samples, 0, blockLength_);
-    const float* const resultLeft = result_[0].data() + start;
-    const float* const resultRight = result_[1].data() + start;
-    for (std::int32_t i = 0; i < count; ++i) {
-        left[i] += scale * resultLeft[i];
-    }
-    for (std::int32_t i = 0; i < count; ++i) {
-        right[i] += scale * resultRight[i];
-    }
+    const auto count = static_cast<std::size_t>(std::clamp(samples, 0, blockLength_));
+    kernels_->addScaled(count, scale, result_[0].data() + start, left, left);
+    kernels_->addScaled(count, scale, result_[1].data() + start, right, right);
 }
 
 }  // namespace tessaly

@@ -114,7 +114,7 @@ private:
     std::vector<const ComplexBin*> inputs_;
     std::array<std::vector<const ComplexBin*>, ears> responses_;
     std::size_t pairs_ = 0;
-    std::array<AlignedArray<float>, ears> result_;  ///< heard now: 2 L, the upper half counts
+    std::array<AlignedArray<float>, ears> result_;  ///< heard now: L samples
     std::array<AlignedArray<float>, ears> next_;    ///< in the making
     bool computing_ = false;
     bool resultStands_ = false;

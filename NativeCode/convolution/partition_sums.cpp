@@ -1,40 +1,78 @@
 // Sums of products of input spectra and partition spectra.
 #include "convolution/partition_sums.h"
 
+#include <algorithm>
+
 #include "convolution/simd/kernels.h"
 #include "convolution/spectral_primitives.h"
 
 namespace tessaly {
 
 PartitionSums::~PartitionSums() {
-    for (ComplexBin** const spectrum : {&part_.left, &part_.right}) {
+    for (ComplexBin** const spectrum : {&part_.left, &part_.right, &product_}) {
         if (*spectrum != nullptr) {
             freeSpectrum(*spectrum);
         }
     }
 }
 
-void PartitionSums::prepare(const Kernels& kernels, std::int32_t bins, std::size_t pairs) {
+void PartitionSums::prepare(const Kernels& kernels,
+                            std::int32_t blockLength,
+                            std::size_t pairs,
+                            bool alsoNaturalOrder) {
     kernels_ = &kernels;
-    bins_ = static_cast<std::size_t>(bins);
+    lanes_ = kernels.transformLanes(blockLength);
+    blockLength_ = static_cast<std::size_t>(blockLength);
     inputs_.resize(pairs);
     left_.resize(pairs);
     right_.resize(pairs);
-    allocSpectrum(part_.left, bins);
-    allocSpectrum(part_.right, bins);
+    allocSpectrum(part_.left, blockLength + 1);
+    allocSpectrum(part_.right, blockLength + 1);
+    if (alsoNaturalOrder) {
+        allocSpectrum(product_, blockLength + 1);
+    }
 }
 
-void PartitionSums::run(bool onto, const EarSpectra& sum) noexcept {
-    kernels_->listSum(bins_, count_, inputs_.data(), left_.data(), right_.data(), onto, sum.left,
-                      sum.right);
+void PartitionSums::run(const EarSpectra& base, const EarSpectra& sum) noexcept {
+    if (naturalOrder_) {
+        runInOrder(left_.data(), base.left, sum.left);
+        runInOrder(right_.data(), base.right, sum.right);
+    } else {
+        kernels_->sumOfProducts(lanes_, blockLength_, count_, inputs_.data(), left_.data(),
+                                right_.data(), base.left, base.right, sum.left, sum.right);
+    }
+}
+
+/// One product at a time.
+void PartitionSums::runInOrder(const ComplexBin* const* responses,
+                               const ComplexBin* base,
+                               ComplexBin* sum) noexcept {
+    for (std::size_t k = 0; k < count_; ++k) {
+        if (base == nullptr) {
+            kernels_->multiply(bins(), inputs_[k], responses[k], sum);
+        } else {
+            kernels_->multiply(bins(), inputs_[k], responses[k], product_);
+            kernels_->add(bins(), product_, base, sum);
+        }
+        base = sum;
+    }
 }
 
 bool PartitionSums::store(const EarSpectra& sum) noexcept {
-    run(false, sum);
+    run({}, sum);
     return count_ > 0;
 }
 
-void PartitionSums::addTo(const EarSpectra& sum) noexcept { run(true, sum); }
+void PartitionSums::store(const EarSpectra& base, const EarSpectra& sum) noexcept {
+    if (count_ > 0) {
+        run(base, sum);
+    } else {
+        std::copy_n(base.left, bins(), sum.left);
+        std::copy_n(base.right, bins(), sum.right);
+    }
+}
+
+void PartitionSums::addTo(const EarSpectra& sum) noexcept { run(sum, sum); }
 
 void PartitionSums::addTo(const EarSpectra& sum, float gain) noexcept {
     if (store(part_)) {
@@ -45,14 +83,8 @@ void PartitionSums::addTo(const EarSpectra& sum, float gain) noexcept {
 void PartitionSums::addScaled(const EarSpectra& term,
                               float gain,
                               const EarSpectra& sum) const noexcept {
-    for (std::size_t i = 0; i < bins_; ++i) {
-        sum.left[i].re += term.left[i].re * gain;
-        sum.left[i].im += term.left[i].im * gain;
-    }
-    for (std::size_t i = 0; i < bins_; ++i) {
-        sum.right[i].re += term.right[i].re * gain;
-        sum.right[i].im += term.right[i].im * gain;
-    }
+    kernels_->addScaled(2 * bins(), gain, &term.left->re, &sum.left->re, &sum.left->re);
+    kernels_->addScaled(2 * bins(), gain, &term.right->re, &sum.right->re, &sum.right->re);
 }
 
 }  // namespace tessaly

@@ -38,13 +38,16 @@ bool stillAllowed(std::int32_t& left) noexcept {
 constinit SpectralFaults spectralFaults;
 
 struct TransformPlan {
-    explicit TransformPlan(std::int32_t length)
+    TransformPlan(std::int32_t length, bool blocksOnly)
         : kernels(selectKernels()),
-          tables(transformTables(length / 2, kernels.transformLanes(length / 2))),
+          tables(blocksOnly ? nullptr
+                            : transformTables(length / 2, kernels.transformLanes(length / 2))),
+          blocks(blockTables(length / 2, kernels.transformLanes(length / 2))),
           work(length > stackLength ? transformWorkFloats(length / 2) : 0) {}
 
     const Kernels& kernels;
-    const TransformTables* tables;
+    const TransformTables* tables;  ///< null in a plan for block spectra only
+    const BlockTables* blocks;
     AlignedArray<float> work;  ///< of long transforms; short ones work on the stack
     bool committed = false;
 };
@@ -69,12 +72,16 @@ const char* transformMessage(std::int32_t status) noexcept {
             return "transform is not committed";
         case transformNullArray:
             return "transform input or output is missing";
+        case transformOtherKind:
+            return "transform is for block spectra only";
         default:
             return "unknown transform status";
     }
 }
 
-std::int32_t createTransform(TransformHandle& handle, std::int32_t length) noexcept {
+namespace {
+
+std::int32_t createPlan(TransformHandle& handle, std::int32_t length, bool blocksOnly) noexcept {
     handle.reset();
     if (length < transformLengthMin || length > transformLengthMax ||
         !std::has_single_bit(static_cast<std::uint32_t>(length))) {
@@ -84,15 +91,26 @@ std::int32_t createTransform(TransformHandle& handle, std::int32_t length) noexc
         return transformNoMemory;
     }
     try {
-        handle.reset(std::make_unique<TransformPlan>(length).release());
+        handle.reset(std::make_unique<TransformPlan>(length, blocksOnly).release());
     } catch (const std::bad_alloc&) {
         return transformNoMemory;
     }
-    if (handle->tables == nullptr) {
+    if (handle->blocks == nullptr || (handle->tables == nullptr && !blocksOnly)) {
         handle.reset();
         return transformNoMemory;
     }
     return transformOk;
+}
+
+}  // namespace
+
+std::int32_t createTransform(TransformHandle& handle, std::int32_t length) noexcept {
+    return createPlan(handle, length, false);
+}
+
+std::int32_t createBlockTransform(TransformHandle& handle, std::int32_t length) noexcept {
+    const std::int32_t status = createPlan(handle, length, true);
+    return status == transformOk ? commitTransform(handle) : status;
 }
 
 std::int32_t setTransformValue(const TransformHandle& handle,
@@ -135,11 +153,30 @@ std::int32_t compute(const TransformHandle& handle,
     }
     if (handle->work.empty()) {
         alignas(AlignedArray<float>::alignment) float work[stackFloats];
-        transform(handle->kernels, *handle->tables, static_cast<float*>(work));
-    } else {
-        transform(handle->kernels, *handle->tables, handle->work.data());
+        return transform(*handle, static_cast<float*>(work));
     }
-    return transformOk;
+    return transform(*handle, handle->work.data());
+}
+
+/// A transform of the handle's plan for natural order.
+template <typename Transform>
+auto inOrder(Transform&& transform) noexcept {
+    return [transform](const TransformPlan& plan, float* work) noexcept {
+        if (plan.tables == nullptr) {
+            return transformOtherKind;
+        }
+        transform(plan.kernels, *plan.tables, work);
+        return transformOk;
+    };
+}
+
+/// A transform of its plan for block spectra.
+template <typename Transform>
+auto ofBlocks(Transform&& transform) noexcept {
+    return [transform](const TransformPlan& plan, float* work) noexcept {
+        transform(plan.kernels, *plan.blocks, work);
+        return transformOk;
+    };
 }
 
 std::int32_t reportForward(std::int32_t status) noexcept {
@@ -162,53 +199,48 @@ std::int32_t computeForward(const TransformHandle& handle,
                             const float* input,
                             ComplexBin* output) noexcept {
     return compute(handle, input, output,
-                   [&](const Kernels& kernels, const auto& tables, float* work) {
+                   inOrder([=](const Kernels& kernels, const TransformTables& tables, float* work) {
                        kernels.forward(tables, input, output, work);
-                   });
-}
-
-std::int32_t computeForwardHalf(const TransformHandle& handle,
-                                const float* input,
-                                ComplexBin* output) noexcept {
-    return compute(handle, input, output,
-                   [&](const Kernels& kernels, const auto& tables, float* work) {
-                       kernels.forwardHalf(tables, input, output, work);
-                   });
+                   }));
 }
 
 std::int32_t computeBackward(const TransformHandle& handle,
                              const ComplexBin* input,
                              float* output) noexcept {
     return compute(handle, input, output,
-                   [&](const Kernels& kernels, const auto& tables, float* work) {
+                   inOrder([=](const Kernels& kernels, const TransformTables& tables, float* work) {
                        kernels.backward(tables, input, output, work);
-                   });
+                   }));
 }
 
-std::int32_t computeBackwardMiddle(const TransformHandle& handle,
-                                   const ComplexBin* input,
-                                   float* output,
-                                   std::int32_t samples) noexcept {
-    return compute(
-        handle, input, output, [&](const Kernels& kernels, const auto& tables, float* work) {
-            const auto wanted = static_cast<std::size_t>(std::clamp(samples, 0, tables.points));
-            kernels.backwardMiddle(tables, input, output, work, wanted);
-        });
-}
-
-std::int32_t computeBackwardBlock(const TransformHandle& handle,
-                                  const ComplexBin* input,
-                                  float* output) noexcept {
+std::int32_t computeWindow(const TransformHandle& handle,
+                           const float* input,
+                           ComplexBin* output) noexcept {
     return compute(handle, input, output,
-                   [&](const Kernels& kernels, const auto& tables, float* work) {
-                       if (tables.points > stackLength / 2) {
-                           kernels.backward(tables, input, output, work);
-                           return;
-                       }
-                       alignas(AlignedArray<float>::alignment) float scratch[stackFloats];
-                       kernels.backwardBlock(tables, input, output + tables.points, work,
-                                             static_cast<float*>(scratch));
-                   });
+                   ofBlocks([=](const Kernels& kernels, const BlockTables& tables, float*) {
+                       kernels.window(tables, input, output);
+                   }));
+}
+
+std::int32_t computePartition(const TransformHandle& handle,
+                              const float* input,
+                              ComplexBin* output) noexcept {
+    return compute(handle, input, output,
+                   ofBlocks([=](const Kernels& kernels, const BlockTables& tables, float*) {
+                       kernels.partition(tables, input, output);
+                   }));
+}
+
+std::int32_t computeBlock(const TransformHandle& handle,
+                          const ComplexBin* input,
+                          float* output,
+                          std::int32_t samples) noexcept {
+    return compute(handle, input, output,
+                   ofBlocks([=](const Kernels& kernels, const BlockTables& tables, float* work) {
+                       const auto wanted =
+                           static_cast<std::size_t>(std::clamp(samples, 0, tables.points));
+                       kernels.block(tables, input, output, work, wanted);
+                   }));
 }
 
 std::int32_t createFFT(TransformHandle& handle, std::int32_t length) noexcept {
@@ -236,10 +268,16 @@ std::int32_t FFT(const float* input, ComplexBin* output, const TransformHandle& 
     return reportForward(computeForward(handle, input, output));
 }
 
-std::int32_t halfFFT(const float* input,
-                     ComplexBin* output,
-                     const TransformHandle& handle) noexcept {
-    return reportForward(computeForwardHalf(handle, input, output));
+std::int32_t windowFFT(const float* input,
+                       ComplexBin* output,
+                       const TransformHandle& handle) noexcept {
+    return reportForward(computeWindow(handle, input, output));
+}
+
+std::int32_t partitionFFT(const float* input,
+                          ComplexBin* output,
+                          const TransformHandle& handle) noexcept {
+    return reportForward(computePartition(handle, input, output));
 }
 
 std::int32_t IFFT(const ComplexBin* input, float* output, const TransformHandle& handle) noexcept {
@@ -248,15 +286,9 @@ std::int32_t IFFT(const ComplexBin* input, float* output, const TransformHandle&
 
 std::int32_t blockIFFT(const ComplexBin* input,
                        float* output,
+                       std::int32_t samples,
                        const TransformHandle& handle) noexcept {
-    return reportBackward(computeBackwardBlock(handle, input, output));
-}
-
-std::int32_t middleIFFT(const ComplexBin* input,
-                        float* output,
-                        std::int32_t samples,
-                        const TransformHandle& handle) noexcept {
-    return reportBackward(computeBackwardMiddle(handle, input, output, samples));
+    return reportBackward(computeBlock(handle, input, output, samples));
 }
 
 void allocSpectrum(ComplexBin*& slot, std::int32_t count) noexcept {

@@ -25,6 +25,7 @@ constexpr std::int32_t transformEmptyHandle = 3;   ///< no plan behind the handl
 constexpr std::int32_t transformBadSetting = 4;    ///< a setting this service does not offer
 constexpr std::int32_t transformNotCommitted = 5;  ///< the plan was never committed
 constexpr std::int32_t transformNullArray = 6;     ///< input or output is null
+constexpr std::int32_t transformOtherKind = 7;     ///< the plan is for block spectra only
 
 constexpr std::int32_t transformLengthMin = 4;
 constexpr std::int32_t transformLengthMax = 65536;
@@ -48,26 +49,33 @@ std::int32_t commitTransform(const TransformHandle& handle) noexcept;
 std::int32_t computeForward(const TransformHandle& handle,
                             const float* input,
                             ComplexBin* output) noexcept TESSALY_NONBLOCKING;
-/// As computeForward, of B reals that B zeros follow; the zeros are not read. Block time.
-std::int32_t computeForwardHalf(const TransformHandle& handle,
-                                const float* input,
-                                ComplexBin* output) noexcept TESSALY_NONBLOCKING;
 /// B+1 bins to 2B reals, e^(+i...), no scale factor: forward and backward multiply by 2B. The
 /// imaginary parts of bins 0 and B are ignored; the arrays must not overlap. Block time.
 std::int32_t computeBackward(const TransformHandle& handle,
                              const ComplexBin* input,
                              float* output) noexcept TESSALY_NONBLOCKING;
-/// As computeBackward, of which only samples B to B + `samples` - 1 are wanted: `output` holds 2B
-/// floats all the same, and the others are undefined. Block time.
-std::int32_t computeBackwardMiddle(const TransformHandle& handle,
-                                   const ComplexBin* input,
-                                   float* output,
-                                   std::int32_t samples) noexcept TESSALY_NONBLOCKING;
-/// As computeBackward, of which samples B to 2B - 1 are wanted: of `output`, 2B floats, the others
-/// are undefined. Block time.
-std::int32_t computeBackwardBlock(const TransformHandle& handle,
-                                  const ComplexBin* input,
-                                  float* output) noexcept TESSALY_NONBLOCKING;
+
+/// The transform of overlap-save blocks, of which only the second half of a result is heard: B bins
+/// whose products stand for convolution with that half right, in an order of the chosen kernels'
+/// own. Such spectra mix with each other only, and only if made with the same kernels.
+/// 2B reals, the input window, to B bins. Block time.
+std::int32_t computeWindow(const TransformHandle& handle,
+                           const float* input,
+                           ComplexBin* output) noexcept TESSALY_NONBLOCKING;
+/// As computeWindow, of B reals that B zeros follow, a partition of a response; the zeros are not
+/// read. Block time.
+std::int32_t computePartition(const TransformHandle& handle,
+                              const float* input,
+                              ComplexBin* output) noexcept TESSALY_NONBLOCKING;
+/// B bins to samples B to B + `samples` - 1 of the window, 2B times as computeBackward gives them.
+/// `output` has room for B floats; those behind the samples are undefined. Block time.
+std::int32_t computeBlock(const TransformHandle& handle,
+                          const ComplexBin* input,
+                          float* output,
+                          std::int32_t samples) noexcept TESSALY_NONBLOCKING;
+/// A committed plan of which only the three above can be used. Load time: allocates.
+/// @return a status; on failure the handle is null
+std::int32_t createBlockTransform(TransformHandle& handle, std::int32_t length) noexcept;
 
 /// Creates, sets and commits a plan for `length` real samples. A failing step writes a trace line
 /// and the next one runs all the same. Load time: allocates.
@@ -76,22 +84,21 @@ std::int32_t createFFT(TransformHandle& handle, std::int32_t length) noexcept;
 /// Forward transform; a refusal is a line on the standard output log and leaves `output` as it
 /// was. Block time, but for that line.
 std::int32_t FFT(const float* input, ComplexBin* output, const TransformHandle& handle) noexcept;
-/// Forward transform of B samples and B zeros; likewise. Block time.
-std::int32_t halfFFT(const float* input,
-                     ComplexBin* output,
-                     const TransformHandle& handle) noexcept;
+/// Transforms of a window and of a partition to block spectra; likewise. Block time.
+std::int32_t windowFFT(const float* input,
+                       ComplexBin* output,
+                       const TransformHandle& handle) noexcept;
+std::int32_t partitionFFT(const float* input,
+                          ComplexBin* output,
+                          const TransformHandle& handle) noexcept;
 /// Backward transform; a refusal is a trace line and leaves `output` as it was. Block time.
 std::int32_t IFFT(const ComplexBin* input, float* output, const TransformHandle& handle) noexcept;
-/// Backward transform of which only samples B to 2B - 1 are wanted; likewise. Block time.
+/// Backward transform of a block spectrum, the first `samples` of its B samples; likewise. Block
+/// time.
 std::int32_t blockIFFT(const ComplexBin* input,
                        float* output,
+                       std::int32_t samples,
                        const TransformHandle& handle) noexcept;
-/// Backward transform of which only samples B to B + `samples` - 1 are wanted; likewise. Block
-/// time.
-std::int32_t middleIFFT(const ComplexBin* input,
-                        float* output,
-                        std::int32_t samples,
-                        const TransformHandle& handle) noexcept;
 
 /// Fills `slot` with `count` zeroed bins on a 64-byte boundary; load time. On failure (no memory,
 /// or a count below 1) the slot is null, `essError` is -202 and a trace line tells.

@@ -1,4 +1,4 @@
-// Computes the twiddle factors of the real transform.
+// Computes the twiddle factors of the transforms.
 #include "convolution/transform_tables.h"
 
 #include <array>
@@ -8,6 +8,7 @@
 #include <new>
 #include <numbers>
 #include <utility>
+#include <vector>
 
 #include "base/aligned_array.h"
 #include "base/precision.h"
@@ -105,28 +106,135 @@ private:
     TransformTables tables_;
 };
 
+/// Floats of the passes over rings, the last one of radix 2, 4 or 8.
+std::size_t ringFloats(std::int32_t columns) {
+    std::size_t floats = 0;
+    std::size_t rings = 1;
+    std::int32_t n = columns;
+    for (; n > 8; n /= 4) {
+        floats += 6 * rings;
+        rings *= 4;
+    }
+    return floats + 2 * static_cast<std::size_t>(n - 1) * rings;
+}
+
+/// Floats of the passes across the lanes, four rows at a time.
+std::size_t acrossFloats(std::int32_t points, std::int32_t lanes) {
+    if (lanes == 1) {
+        return 0;
+    }
+    const std::int32_t groups = lanes / 4;
+    const std::int32_t vectors = 3 + (4 - 4 / groups);
+    return static_cast<std::size_t>(points / 4) * 2 * static_cast<std::size_t>(vectors);
+}
+
+class BlockTableStorage {
+public:
+    BlockTableStorage(std::int32_t points, std::int32_t lanes)
+        : rings_(ringFloats(points / lanes)), across_(acrossFloats(points, lanes)) {
+        tables_.points = points;
+        tables_.lanes = lanes;
+        tables_.columns = points / lanes;
+        tables_.rings = rings_.data();
+        tables_.across = across_.data();
+        fillRings();
+    }
+
+    const BlockTables& tables() const { return tables_; }
+
+private:
+    /// A ring of polynomials with u^n = c is known by the turn of c, as a share of the circle: c =
+    /// e^(-2 pi i turn), a fraction whose denominator is a power of two.
+    void fillRings() {
+        std::vector<double> turns{0.75};  // u^M = i
+        float* out = rings_.data();
+        const auto splitBy = [&](std::int32_t radix) {
+            std::vector<double> split;
+            split.reserve(turns.size() * static_cast<std::size_t>(radix));
+            for (const double turn : turns) {
+                const double root = turn / radix;
+                for (std::int32_t r = 1; r < radix; ++r) {
+                    out = write(out, 1, root * r);
+                }
+                for (std::int32_t r = 0; r < radix; ++r) {
+                    split.push_back(root + static_cast<double>(r) / radix);
+                }
+            }
+            turns = std::move(split);
+        };
+        std::int32_t n = tables_.columns;
+        for (; n > 8; n /= 4) {
+            splitBy(4);
+        }
+        splitBy(n);
+
+        fillAcross(turns);
+    }
+
+    /// Four rows at a time: see the passes across the lanes.
+    void fillAcross(const std::vector<double>& turns) {
+        float* out = across_.data();
+        const std::int32_t lanes = tables_.lanes;
+        const std::int32_t groups = lanes / 4;  // of four lanes: 1, 2 or 4
+        const auto writeLanes = [&](auto&& turnOf) {
+            for (std::int32_t lane = 0; lane < lanes; ++lane) {
+                write(out + lane, static_cast<std::size_t>(lanes), turnOf(lane));
+            }
+            out += std::ptrdiff_t{2} * lanes;
+        };
+        for (std::size_t first = 0; groups > 0 && first < turns.size(); first += 4) {
+            // Vector k has lane group k % groups of the rows k / groups * groups + lane / 4.
+            for (std::int32_t k = 0; k < 4; ++k) {
+                if (k % groups != 0) {
+                    writeLanes([&](std::int32_t lane) {
+                        const auto row = static_cast<std::size_t>(k / groups * groups + lane / 4);
+                        return turns[first + row] * (k % groups) / groups;
+                    });
+                }
+            }
+            // Four by four later, what was vector k is lane k of each group of four.
+            for (std::int32_t power = 1; power < 4; ++power) {
+                writeLanes([&](std::int32_t lane) {
+                    const std::int32_t k = lane % 4;
+                    const auto row = static_cast<std::size_t>(k / groups * groups + lane / 4);
+                    return (turns[first + row] + k % groups) / groups * power / 4.0;
+                });
+            }
+        }
+    }
+
+    /// e^(-2 pi i turn), the imaginary part `apart` floats behind the real one. @return behind both
+    static float* write(float* out, std::size_t apart, double turn) {
+        const double angle = 2.0 * std::numbers::pi * turn;
+        out[0] = single(std::cos(angle));
+        out[apart] = single(-std::sin(angle));
+        return out + apart + 1;
+    }
+
+    AlignedArray<float> rings_;
+    AlignedArray<float> across_;
+    BlockTables tables_;
+};
+
 // A function-local static for each length and lane count: the language makes each one once, also
 // when two engines are built on two threads, and only those asked for exist.
-template <std::size_t Index>
-const TransformTables& tablesAt() {
+template <class Storage, std::size_t Index>
+const auto& tablesAt() {
     constexpr std::int32_t points = std::int32_t{1} << (exponentMin + Index % exponentCount);
     constexpr std::int32_t lanes = laneCounts[Index / exponentCount];
-    static const TableStorage storage(points, lanes);
+    static const Storage storage(points, lanes);
     return storage.tables();
 }
 
-using TablesFunction = const TransformTables& (*)();
-
-template <std::size_t... Index>
-constexpr std::array<TablesFunction, sizeof...(Index)> listTables(std::index_sequence<Index...>) {
-    return {&tablesAt<Index>...};
+template <class Storage, class Tables, std::size_t... Index>
+constexpr auto listTables(std::index_sequence<Index...>) {
+    return std::array<const Tables& (*)(), sizeof...(Index)>{&tablesAt<Storage, Index>...};
 }
 
-}  // namespace
-
-const TransformTables* transformTables(std::int32_t points, std::int32_t lanes) noexcept {
+template <class Storage, class Tables>
+const Tables* find(std::int32_t points, std::int32_t lanes) noexcept {
     static constexpr auto functions =
-        listTables(std::make_index_sequence<exponentCount * laneCounts.size()>());
+        listTables<Storage, Tables>(std::make_index_sequence<exponentCount * laneCounts.size()>());
     if (points < 2 || !std::has_single_bit(static_cast<std::uint32_t>(points)) ||
         points > (std::int32_t{1} << exponentMax)) {
         return nullptr;
@@ -143,6 +251,16 @@ const TransformTables* transformTables(std::int32_t points, std::int32_t lanes) 
         }
     }
     return nullptr;
+}
+
+}  // namespace
+
+const TransformTables* transformTables(std::int32_t points, std::int32_t lanes) noexcept {
+    return find<TableStorage, TransformTables>(points, lanes);
+}
+
+const BlockTables* blockTables(std::int32_t points, std::int32_t lanes) noexcept {
+    return find<BlockTableStorage, BlockTables>(points, lanes);
 }
 
 }  // namespace tessaly

@@ -13,5 +13,7 @@ namespace tessaly {
 /// @param lanes   1, 4, 8 or 16, with lanes * lanes <= points
 /// @return null if there is no memory or no such table
 const TransformTables* transformTables(std::int32_t points, std::int32_t lanes) noexcept;
+/// Likewise, of the transform of blocks.
+const BlockTables* blockTables(std::int32_t points, std::int32_t lanes) noexcept;
 
 }  // namespace tessaly

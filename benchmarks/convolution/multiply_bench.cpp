@@ -1,4 +1,5 @@
-// Multiply-accumulate of both ears over a ring: our tables, fused; plain separate scalar passes;
+// Multiply-accumulate of both ears over a ring: our tables, fused, on their block spectra, the
+// pairs of partition and slot collected as the convolver does; plain separate scalar passes;
 // and nothing but reading the same spectra, which bounds them all. Names: Mac/<table, plain or
 // read>/<block length>/<partitions>.
 #include <benchmark/benchmark.h>
@@ -46,11 +47,17 @@ void multiply(benchmark::State& state,
     AlignedArray<ComplexBin> sumL(bins);
     AlignedArray<ComplexBin> sumR(bins);
     AlignedArray<ComplexBin> scratch(bins);
+    std::vector<const ComplexBin*> slots(partitions);
+    const std::int32_t lanes =
+        kernels != nullptr ? kernels->transformLanes(static_cast<std::int32_t>(blockLength)) : 1;
     std::size_t newest = 0;
     for (auto _ : state) {
         if (form == Form::fused) {
-            kernels->ringSum(bins, partitions, newest, ring.data(), left.data(), right.data(),
-                             sumL.data(), sumR.data());
+            for (std::size_t i = 0; i < partitions; ++i) {
+                slots[i] = ring.data()[(newest + partitions - i) % partitions];
+            }
+            kernels->sumOfProducts(lanes, blockLength, partitions, slots.data(), left.data(),
+                                   right.data(), nullptr, nullptr, sumL.data(), sumR.data());
         } else if (form == Form::plain) {
             plainRingSum(bins, partitions, newest, ring.data(), left.data(), scratch.data(),
                          sumL.data());

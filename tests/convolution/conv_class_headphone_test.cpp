@@ -58,12 +58,15 @@ protected:
         }
         return result;
     }
-    static void expectNear(const std::vector<double>& expected, const std::vector<float>& found) {
+    /// From sample `first` on.
+    static void expectNear(const std::vector<double>& expected,
+                           const std::vector<float>& found,
+                           std::size_t first = 0) {
         double peak = 0.0;
         for (const double value : expected) {
             peak = std::max(peak, std::abs(value));
         }
-        for (std::size_t i = 0; i < expected.size(); ++i) {
+        for (std::size_t i = first; i < expected.size(); ++i) {
             ASSERT_NEAR(static_cast<double>(found[i]), expected[i], 3e-6 * peak) << i;
         }
     }
@@ -106,6 +109,61 @@ TEST_F(ConvClassHeadphone, OnePartitionIsCompensatedInPlainAndCrossfadeBlocks) {
     expectNear(compensated(rig, oldLeft), rig.secondLeft);
     expectNear(compensated(rig, rig.filterLeft), rig.firstLeft);
     expectNear(compensated(rig, rig.filterRight), rig.firstRight);
+}
+
+TEST_F(ConvClassHeadphone, ComesAndGoesWhileOnePartitionPlays) {
+    // Compensation needs another kind of spectra: what stands when it is switched on, and off
+    // again, is the response that was heard before, with or without an update in between.
+    const LogCapture log;
+    for (const bool updateMeanwhile : {false, true}) {
+        for (const bool crossfadeFirst : {false, true}) {
+            SCOPED_TRACE(testing::Message() << updateMeanwhile << crossfadeFirst);
+            reset();
+            ConvolverRig rig(32, 1);
+            rig.heardOfOld = 32;
+            lend(rig, 64);
+            rig.makeBoth();
+            fillFilters(rig);
+            rig.feed(noise_.samples(32));
+            rig.run(true);
+            const auto plain = [&rig](const std::vector<float>& fir) {
+                RingModel model(32, 1);
+                model.setResponse(fir);
+                model.ring[0].assign(rig.window.begin(), rig.window.end());
+                return model.output(model.ring, 0);
+            };
+            expectNear(plain(rig.filterLeft), rig.firstLeft, 32);
+
+            rig.hpTFactive = true;
+            rig.hpTFselect = 1;
+            rig.feed(noise_.samples(32));
+            rig.run(false);
+            EXPECT_THAT(rig.firstLeft, Each(0.0f)) << "nothing compensated stands yet";
+            if (updateMeanwhile) {
+                if (!crossfadeFirst) {
+                    fillFilters(rig);
+                }
+                rig.feed(noise_.samples(32));
+                rig.run(true);
+                expectNear(compensated(rig, rig.filterLeft), rig.firstLeft);
+                expectNear(compensated(rig, rig.filterRight), rig.firstRight);
+            }
+
+            rig.hpTFactive = false;
+            const std::vector<float> oldLeft = rig.filterLeft;
+            if (crossfadeFirst) {
+                fillFilters(rig);
+                rig.feed(noise_.samples(32));
+                rig.run(true);
+                expectNear(plain(oldLeft), rig.secondLeft, 32);
+                expectNear(plain(rig.filterLeft), rig.firstLeft, 32);
+            }
+            rig.feed(noise_.samples(32));
+            rig.run(false);
+            expectNear(plain(rig.filterLeft), rig.firstLeft, 32);
+            expectNear(plain(rig.filterRight), rig.firstRight, 32);
+        }
+    }
 }
 
 TEST_F(ConvClassHeadphone, LaterInstancesReadTheCommonSpectrumAndMakeNone) {
@@ -163,7 +221,7 @@ TEST_F(ConvClassHeadphone, SeveralPartitionsStayUncompensatedAndSaySoOnceAnUpdat
     RingModel model(32, 3);
     model.setResponse(rig.filterLeft);
     model.ring[0].assign(rig.window.begin(), rig.window.end());
-    expectNear(model.output(model.ring, 0), rig.firstLeft);
+    expectNear(model.output(model.ring, 0), rig.firstLeft, 32);
 
     log.clear();
     rig.run(false);

@@ -84,98 +84,115 @@ TEST_P(KernelTable, MultiplyCarriesNotANumberAndInfinity) {
     }
 }
 
-TEST_P(KernelTable, RingSumEqualsPlainPassesWithinItsBound) {
-    // Ring and partition index run against each other, from every newest slot.
-    for (const std::size_t partitions : {1u, 2u, 3u, 4u, 5u, 7u, 8u, 9u, 13u}) {
-        for (const std::size_t bins : lengths) {
-            Noise noise(static_cast<std::uint32_t>(bins * 100 + partitions));
-            const std::size_t offset = bins % 4;  // unaligned as well
-            std::vector<std::vector<ComplexBin>> storage;
-            const auto pointers = [&] {
-                std::vector<const ComplexBin*> entries;
-                for (std::size_t i = 0; i < partitions; ++i) {
-                    storage.push_back(noise.bins(bins + offset));
-                    entries.push_back(storage.back().data() + offset);
+/// A block spectrum's bins one by one: groups of `lanes` real and as many imaginary parts.
+std::vector<ComplexBin> unpacked(const ComplexBin* spectrum, std::size_t bins, std::size_t lanes) {
+    std::vector<ComplexBin> values(bins);
+    const float* const floats = &spectrum->re;
+    for (std::size_t k = 0; k < bins; ++k) {
+        const std::size_t at = k / lanes * 2 * lanes + k % lanes;
+        values[k] = {floats[at], floats[at + lanes]};
+    }
+    return values;
+}
+
+TEST_P(KernelTable, SumOfProductsEqualsPlainPassesOntoAnyBase) {
+    for (const std::size_t lanes : {1u, 4u, 8u, 16u}) {
+        if (GetParam()->transformLanes(static_cast<std::int32_t>(lanes * lanes * 4)) !=
+            static_cast<std::int32_t>(lanes)) {
+            continue;  // not a width of this table
+        }
+        for (const std::size_t count : {1u, 2u, 3u, 4u, 5u, 8u, 11u}) {
+            for (const std::size_t rows : {1u, 2u, 3u, 7u, 16u}) {
+                const std::size_t bins = rows * lanes;
+                Noise noise(static_cast<std::uint32_t>(bins * 100 + count));
+                const std::size_t offset = count % 3;  // unaligned as well
+                std::vector<std::vector<ComplexBin>> storage;
+                storage.reserve(3 * count);
+                const auto pointers = [&] {
+                    std::vector<const ComplexBin*> entries;
+                    for (std::size_t i = 0; i < count; ++i) {
+                        storage.push_back(noise.bins(bins + offset));
+                        entries.push_back(storage.back().data() + offset);
+                    }
+                    return entries;
+                };
+                const std::vector<const ComplexBin*> input = pointers();
+                const std::vector<const ComplexBin*> left = pointers();
+                const std::vector<const ComplexBin*> right = pointers();
+                const std::vector<ComplexBin> baseL = noise.bins(bins);
+                const std::vector<ComplexBin> baseR = noise.bins(bins);
+                enum class Base { none, apart, same };
+                for (const Base base : {Base::none, Base::apart, Base::same}) {
+                    std::vector<ComplexBin> sumL = baseL;
+                    std::vector<ComplexBin> sumR = baseR;
+                    sumL.push_back({99.0f, 99.0f});
+                    sumR.push_back({99.0f, 99.0f});
+                    const auto from = [base](const std::vector<ComplexBin>& apart,
+                                             const std::vector<ComplexBin>& same) {
+                        return base == Base::none    ? nullptr
+                               : base == Base::apart ? apart.data()
+                                                     : same.data();
+                    };
+                    GetParam()->sumOfProducts(static_cast<std::int32_t>(lanes), bins, count,
+                                              input.data(), left.data(), right.data(),
+                                              from(baseL, sumL), from(baseR, sumR), sumL.data(),
+                                              sumR.data());
+                    // Noise is below 1, so each part of a product is below 2.
+                    const float bound =
+                        4.0f * static_cast<float>((count + 1) * (count + 2)) * 0x1p-24f;
+                    const auto compare = [&](const std::vector<const ComplexBin*>& response,
+                                             const std::vector<ComplexBin>& start,
+                                             const std::vector<ComplexBin>& sum) {
+                        std::vector<ComplexBin> expected =
+                            base == Base::none ? std::vector<ComplexBin>(bins)
+                                               : unpacked(start.data(), bins, lanes);
+                        std::vector<ComplexBin> scratch(bins);
+                        for (std::size_t n = 0; n < count; ++n) {
+                            plainMultiply(bins, unpacked(input[n], bins, lanes).data(),
+                                          unpacked(response[n], bins, lanes).data(),
+                                          scratch.data());
+                            plainAdd(bins, scratch.data(), expected.data(), expected.data());
+                        }
+                        const std::vector<ComplexBin> got = unpacked(sum.data(), bins, lanes);
+                        for (std::size_t i = 0; i < bins; ++i) {
+                            ASSERT_NEAR(got[i].re, expected[i].re, bound) << count << ' ' << bins;
+                            ASSERT_NEAR(got[i].im, expected[i].im, bound) << count << ' ' << bins;
+                        }
+                        EXPECT_EQ(sum.back().re, 99.0f);
+                    };
+                    compare(left, baseL, sumL);
+                    compare(right, baseR, sumR);
                 }
-                return entries;
-            };
-            storage.reserve(3 * partitions);
-            const std::vector<const ComplexBin*> ring = pointers();
-            const std::vector<const ComplexBin*> left = pointers();
-            const std::vector<const ComplexBin*> right = pointers();
-            const std::size_t newest = (bins * 7) % partitions;
-
-            std::vector<ComplexBin> scratch(bins);
-            std::vector<ComplexBin> expectedL(bins);
-            std::vector<ComplexBin> expectedR(bins);
-            plainRing(bins, partitions, newest, ring.data(), left.data(), scratch.data(),
-                      expectedL.data());
-            plainRing(bins, partitions, newest, ring.data(), right.data(), scratch.data(),
-                      expectedR.data());
-
-            std::vector<ComplexBin> sumL(bins + 1, ComplexBin{99.0f, 99.0f});
-            std::vector<ComplexBin> sumR(bins + 1, ComplexBin{99.0f, 99.0f});
-            GetParam()->ringSum(bins, partitions, newest, ring.data(), left.data(), right.data(),
-                                sumL.data(), sumR.data());
-            EXPECT_EQ(sumL.back().re, 99.0f);
-            EXPECT_EQ(sumR.back().re, 99.0f);
-            // Noise is below 1, so each part of a product is below 2.
-            const float bound = 4.0f * static_cast<float>(partitions * (partitions + 2)) * 0x1p-24f;
-            for (std::size_t i = 0; i < bins; ++i) {
-                ASSERT_NEAR(sumL[i].re, expectedL[i].re, bound) << partitions << ' ' << bins;
-                ASSERT_NEAR(sumL[i].im, expectedL[i].im, bound) << partitions << ' ' << bins;
-                ASSERT_NEAR(sumR[i].re, expectedR[i].re, bound) << partitions << ' ' << bins;
-                ASSERT_NEAR(sumR[i].im, expectedR[i].im, bound) << partitions << ' ' << bins;
             }
         }
     }
 }
 
-TEST_P(KernelTable, ListSumEqualsPlainPassesAndAddsOntoASum) {
-    for (const std::size_t count : {0u, 1u, 2u, 3u, 4u, 5u, 8u, 11u}) {
-        for (const std::size_t bins : lengths) {
-            Noise noise(static_cast<std::uint32_t>(bins * 100 + count));
-            std::vector<std::vector<ComplexBin>> storage;
-            storage.reserve(3 * count);
-            const auto pointers = [&] {
-                std::vector<const ComplexBin*> entries;
-                for (std::size_t i = 0; i < count; ++i) {
-                    storage.push_back(noise.bins(bins));
-                    entries.push_back(storage.back().data());
-                }
-                return entries;
-            };
-            const std::vector<const ComplexBin*> input = pointers();
-            const std::vector<const ComplexBin*> left = pointers();
-            const std::vector<const ComplexBin*> right = pointers();
-            const std::vector<ComplexBin> start = noise.bins(bins);
-            for (const bool onto : {false, true}) {
-                std::vector<ComplexBin> sumL = start;
-                std::vector<ComplexBin> sumR = start;
-                sumL.push_back({99.0f, 99.0f});
-                sumR.push_back({99.0f, 99.0f});
-                GetParam()->listSum(bins, count, input.data(), left.data(), right.data(), onto,
-                                    sumL.data(), sumR.data());
-                const float bound = 4.0f * static_cast<float>((count + 1) * (count + 2)) * 0x1p-24f;
-                const auto compare = [&](const std::vector<const ComplexBin*>& response,
-                                         const std::vector<ComplexBin>& got) {
-                    std::vector<ComplexBin> expected =
-                        onto || count == 0 ? start : std::vector<ComplexBin>(bins);
-                    std::vector<ComplexBin> scratch(bins);
-                    for (std::size_t n = 0; n < count; ++n) {
-                        plainMultiply(bins, input[n], response[n], scratch.data());
-                        plainAdd(bins, scratch.data(), expected.data(), expected.data());
-                    }
-                    for (std::size_t i = 0; i < bins; ++i) {
-                        ASSERT_NEAR(got[i].re, expected[i].re, bound) << count << ' ' << bins;
-                        ASSERT_NEAR(got[i].im, expected[i].im, bound) << count << ' ' << bins;
-                    }
-                    EXPECT_EQ(got.back().re, 99.0f);
-                };
-                compare(left, sumL);
-                compare(right, sumR);
-            }
+TEST_P(KernelTable, SumOfNoProductsWritesNothing) {
+    const std::vector<ComplexBin> before = Noise(3).bins(16);
+    std::vector<ComplexBin> sum = before;
+    GetParam()->sumOfProducts(1, 16, 0, nullptr, nullptr, nullptr, nullptr, nullptr, sum.data(),
+                              sum.data());
+    EXPECT_TRUE(sameBits(sum.data(), before.data(), sum.size()));
+}
+
+TEST_P(KernelTable, AddScaledEqualsThePlainLoopInAnyPlace) {
+    for (const std::size_t count : lengths) {
+        Noise noise(static_cast<std::uint32_t>(count));
+        const std::vector<float> term = noise.samples(count);
+        const std::vector<float> base = noise.samples(count);
+        std::vector<float> apart(count + 1, 99.0f);
+        std::vector<float> ontoBase = base;
+        std::vector<float> ontoTerm = term;
+        GetParam()->addScaled(count, 0.37f, term.data(), base.data(), apart.data());
+        GetParam()->addScaled(count, 0.37f, term.data(), ontoBase.data(), ontoBase.data());
+        GetParam()->addScaled(count, 0.37f, ontoTerm.data(), base.data(), ontoTerm.data());
+        for (std::size_t i = 0; i < count; ++i) {
+            ASSERT_NEAR(apart[i], base[i] + 0.37f * term[i], 1.2e-7f) << count;
+            ASSERT_EQ(apart[i], ontoBase[i]) << count;
+            ASSERT_EQ(apart[i], ontoTerm[i]) << count;
         }
+        EXPECT_EQ(apart.back(), 99.0f);
     }
 }
 
@@ -236,14 +253,14 @@ TEST(KernelDispatch, EveryTableIsComplete) {
     for (const Kernels* kernels : testableKernels()) {
         EXPECT_NE(kernels->transformLanes, nullptr);
         EXPECT_NE(kernels->forward, nullptr);
-        EXPECT_NE(kernels->forwardHalf, nullptr);
         EXPECT_NE(kernels->backward, nullptr);
-        EXPECT_NE(kernels->backwardMiddle, nullptr);
-        EXPECT_NE(kernels->backwardBlock, nullptr);
+        EXPECT_NE(kernels->window, nullptr);
+        EXPECT_NE(kernels->partition, nullptr);
+        EXPECT_NE(kernels->block, nullptr);
+        EXPECT_NE(kernels->sumOfProducts, nullptr);
         EXPECT_NE(kernels->multiply, nullptr);
         EXPECT_NE(kernels->add, nullptr);
-        EXPECT_NE(kernels->ringSum, nullptr);
-        EXPECT_NE(kernels->listSum, nullptr);
+        EXPECT_NE(kernels->addScaled, nullptr);
         EXPECT_NE(kernels->addTaps, nullptr);
         for (std::int32_t points = 2; points <= 32768; points *= 2) {
             const std::int32_t lanes = kernels->transformLanes(points);

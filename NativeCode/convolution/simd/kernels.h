@@ -26,6 +26,20 @@ struct TransformTables {
     const float* split = nullptr;
 };
 
+/// Constants of the transform of blocks, likewise: M points as K rows of L lanes.
+struct BlockTables {
+    std::int32_t points = 0;   ///< M, a power of two from 2, at least L * L
+    std::int32_t lanes = 0;    ///< L: 1, 4, 8 or 16
+    std::int32_t columns = 0;  ///< K
+    /// Passes of radix R = 4, and of 2, 4 or 8 at the end, split rings of polynomials in u with
+    /// u^n = c into R each: for each pass and ring r, r^2 .. r^(R - 1), each as real, imaginary,
+    /// where r^R = c. The first ring has u^M = i.
+    const float* rings = nullptr;
+    /// For four rows at a time: the powers of the rows' roots that the passes across their lanes
+    /// take, each as L real parts and then L imaginary parts. Null with one lane.
+    const float* across = nullptr;
+};
+
 /// Floats of work memory that a transform of M points needs, 64-byte aligned.
 constexpr std::size_t transformWorkFloats(std::int32_t points) noexcept {
     return 2 * (static_cast<std::size_t>(points) + 16);
@@ -41,55 +55,48 @@ struct Kernels {
                     const float* input,
                     ComplexBin* bins,
                     float* work);
-    /// As `forward`, of M samples that M zeros follow; the zeros are not read.
-    void (*forwardHalf)(const TransformTables& tables,
-                        const float* input,
-                        ComplexBin* bins,
-                        float* work);
     /// M + 1 bins to 2M reals, no scale factor; imaginary parts of the first and last bin are
     /// ignored. No array may overlap another.
     void (*backward)(const TransformTables& tables,
                      const ComplexBin* bins,
                      float* output,
                      float* work);
-    /// As `backward`, of which only `samples` samples from the middle on, M to M + samples - 1, are
-    /// wanted: `output` holds 2M floats all the same, and the others are left undefined.
-    void (*backwardMiddle)(const TransformTables& tables,
-                           const ComplexBin* bins,
-                           float* output,
-                           float* work,
-                           std::size_t samples);
-    /// As `backward`, of which only samples M to 2M - 1 are made: `output` holds M floats.
-    /// `scratch` is as large as `work`, and apart from it.
-    void (*backwardBlock)(const TransformTables& tables,
-                          const ComplexBin* bins,
-                          float* output,
-                          float* work,
-                          float* scratch);
+    /// A window of 2M reals to the M bins of a block spectrum, no scale factor. Block spectra are
+    /// values of the polynomial of the samples at M roots of u^M = i, in an order and a layout of
+    /// the table's own; products of them, bin by bin, belong to the products of the polynomials.
+    /// The arrays must not overlap.
+    void (*window)(const BlockTables& tables, const float* input, ComplexBin* bins);
+    /// As `window`, of M reals that M zeros follow; the zeros are not read.
+    void (*partition)(const BlockTables& tables, const float* input, ComplexBin* bins);
+    /// From a block spectrum samples M to M + `samples` - 1 of the window, 2M times, for up to M
+    /// `samples`. `output` holds M floats; those behind the samples are left undefined. No array
+    /// may overlap another.
+    void (*block)(const BlockTables& tables,
+                  const ComplexBin* bins,
+                  float* output,
+                  float* work,
+                  std::size_t samples);
+    /// sumL = baseL + input[0] * left[0] + input[1] * left[1] + ..., `count` products of `bins`
+    /// bins of block spectra made with `lanes` lanes, and sumR with baseR and right. `bins` is a
+    /// multiple of `lanes`. A null base is zero; a base may be its sum. Without a product nothing
+    /// is written. Fused and reordered: the tables differ from each other by at most 2 (N + 2) *
+    /// 2^-24 of the sum of the products' magnitudes, N products.
+    void (*sumOfProducts)(std::int32_t lanes,
+                          std::size_t bins,
+                          std::size_t count,
+                          const ComplexBin* const* input,
+                          const ComplexBin* const* left,
+                          const ComplexBin* const* right,
+                          const ComplexBin* baseL,
+                          const ComplexBin* baseR,
+                          ComplexBin* sumL,
+                          ComplexBin* sumR);
     /// y = a * b and y = a + b, bit for bit the same in every table; y may be a or b.
     void (*multiply)(std::size_t bins, const ComplexBin* a, const ComplexBin* b, ComplexBin* y);
     void (*add)(std::size_t bins, const ComplexBin* a, const ComplexBin* b, ComplexBin* y);
-    /// sumL = ring[newest] * left[0] + ring[newest + i mod N] * left[N - i] for i = 1 .. N - 1, and
-    /// sumR with right; the sums are overwritten. Fused and reordered: the tables differ from each
-    /// other by at most 2 (N + 2) * 2^-24 of the sum of the products' magnitudes.
-    void (*ringSum)(std::size_t bins,
-                    std::size_t partitions,
-                    std::size_t newest,
-                    const ComplexBin* const* ring,
-                    const ComplexBin* const* left,
-                    const ComplexBin* const* right,
-                    ComplexBin* sumL,
-                    ComplexBin* sumR);
-    /// sumL = input[0] * left[0] + input[1] * left[1] + ..., `count` products, and sumR with right;
-    /// with `onto` they are added to what the sums hold. The tables differ as those of `ringSum`.
-    void (*listSum)(std::size_t bins,
-                    std::size_t count,
-                    const ComplexBin* const* input,
-                    const ComplexBin* const* left,
-                    const ComplexBin* const* right,
-                    bool onto,
-                    ComplexBin* sumL,
-                    ComplexBin* sumR);
+    /// sum[i] = base[i] + gain * term[i]; sum may be base or term. Fused in some tables.
+    void (*addScaled)(
+        std::size_t count, float gain, const float* term, const float* base, float* sum);
     /// sumL[n] += left[0] * input[n] + left[1] * input[n - 1] + ..., `taps` products, for n below
     /// `samples`, and sumR with right. `input` has `taps` - 1 samples before its first. The tables
     /// differ from each other by at most 2 (taps + 1) * 2^-24 of the sum of the products'

@@ -6,75 +6,14 @@
 #include <emmintrin.h>
 
 #include "convolution/simd/doubles_x86.h"
-#include "convolution/simd/lanes_scalar.h"
 #include "convolution/simd/lanes_x86.h"
+#include "convolution/simd/table_functions.h"
 
 namespace tessaly {
 namespace {
 
-std::int32_t transformLanes(std::int32_t points) {
-    if (points >= 16) {
-        return 4;
-    }
-    return 1;
-}
-
-void forward(const TransformTables& tables, const float* input, ComplexBin* bins, float* work) {
-    if (tables.lanes == 4) {
-        return forwardLanes<Lanes4>(tables, input, bins, work);
-    }
-    forwardLanes<LanesScalar>(tables, input, bins, work);
-}
-
-void forwardHalf(const TransformTables& tables, const float* input, ComplexBin* bins, float* work) {
-    if (tables.lanes == 4) {
-        return forwardHalfLanes<Lanes4>(tables, input, bins, work);
-    }
-    forwardHalfLanes<LanesScalar>(tables, input, bins, work);
-}
-
-void backward(const TransformTables& tables, const ComplexBin* bins, float* output, float* work) {
-    if (tables.lanes == 4) {
-        return backwardLanes<Lanes4>(tables, bins, output, work);
-    }
-    backwardLanes<LanesScalar>(tables, bins, output, work);
-}
-
-void backwardBlock(const TransformTables& tables,
-                   const ComplexBin* bins,
-                   float* output,
-                   float* work,
-                   float* scratch) {
-    if (tables.lanes == 4) {
-        return backwardBlockLanes<Lanes4>(tables, bins, output, work, scratch);
-    }
-    backwardBlockLanes<LanesScalar>(tables, bins, output, work, scratch);
-}
-
-void backwardMiddle(const TransformTables& tables,
-                    const ComplexBin* bins,
-                    float* output,
-                    float* work,
-                    std::size_t samples) {
-    if (tables.lanes == 4) {
-        return backwardMiddleLanes<Lanes4>(tables, bins, output, work, samples);
-    }
-    backwardMiddleLanes<LanesScalar>(tables, bins, output, work, samples);
-}
-
-constexpr Kernels table{.name = "sse2",
-                        .transformLanes = transformLanes,
-                        .forward = forward,
-                        .forwardHalf = forwardHalf,
-                        .backward = backward,
-                        .backwardMiddle = backwardMiddle,
-                        .backwardBlock = backwardBlock,
-                        .multiply = multiplyBins<Lanes4>,
-                        .add = addBins<Lanes4>,
-                        .ringSum = sumRing<Lanes4>,
-                        .listSum = sumList<Lanes4>,
-                        .addTaps = addTaps<Lanes4>,
-                        .signal = &signalKernelsOf<Lanes4, Stereo1, AheadTwo>};
+constexpr Kernels table =
+    kernelsOver<Lanes4, LanesScalar>("sse2", signalKernelsOf<Lanes4, Stereo1, AheadTwo>);
 
 }  // namespace
 

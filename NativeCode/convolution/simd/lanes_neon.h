@@ -1,7 +1,7 @@
 // A lane type over the 128-bit registers of 64-bit ARM.
 #pragma once
 
-#include "convolution/simd/kernel_template.h"
+#include "convolution/simd/complex_lanes.h"
 
 namespace tessaly {
 namespace {
@@ -46,6 +46,8 @@ struct LanesNeon {
         a[2] = vcombine_f32(vget_high_f32(upper.val[0]), vget_high_f32(lower.val[0]));
         a[3] = vcombine_f32(vget_high_f32(upper.val[1]), vget_high_f32(lower.val[1]));
     }
+    static void exchangeQuarters(Vector (&)[4]) {}
+    static void transposeQuarters(Vector (&a)[4]) { transpose(a); }
 
     static Vector evenLanes(Vector a) { return vtrnq_f32(a, a).val[0]; }
     static Vector oddLanes(Vector a) { return vtrnq_f32(a, a).val[1]; }

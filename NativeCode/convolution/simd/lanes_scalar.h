@@ -1,7 +1,7 @@
 // A lane type of one lane, for the lengths too short for wider ones and for the plain table.
 #pragma once
 
-#include "convolution/simd/kernel_template.h"
+#include "convolution/simd/complex_lanes.h"
 
 namespace tessaly {
 namespace {

@@ -1,7 +1,7 @@
 // Lane types over the registers of x86, as wide as the including source is built for.
 #pragma once
 
-#include "convolution/simd/kernel_template.h"
+#include "convolution/simd/complex_lanes.h"
 
 namespace tessaly {
 namespace {
@@ -47,6 +47,8 @@ struct Lanes4 {
         store(p + 4, _mm_unpackhi_ps(re, im));
     }
     static void transpose(Vector (&a)[4]) { _MM_TRANSPOSE4_PS(a[0], a[1], a[2], a[3]); }
+    static void exchangeQuarters(Vector (&)[4]) {}
+    static void transposeQuarters(Vector (&a)[4]) { transpose(a); }
 
     static Vector evenLanes(Vector a) { return _mm_shuffle_ps(a, a, _MM_SHUFFLE(2, 2, 0, 0)); }
     static Vector oddLanes(Vector a) { return _mm_shuffle_ps(a, a, _MM_SHUFFLE(3, 3, 1, 1)); }
@@ -120,12 +122,32 @@ struct Lanes8 {
         a[7] = _mm256_permute2f128_ps(u3, u7, 0x31);
     }
 
+    static void exchangeQuarters(Vector (&a)[4]) {
+        exchangeHalves(a[0], a[1]);
+        exchangeHalves(a[2], a[3]);
+    }
+    static void transposeQuarters(Vector (&a)[4]) {
+        const Vector low01 = _mm256_unpacklo_ps(a[0], a[1]);
+        const Vector high01 = _mm256_unpackhi_ps(a[0], a[1]);
+        const Vector low23 = _mm256_unpacklo_ps(a[2], a[3]);
+        const Vector high23 = _mm256_unpackhi_ps(a[2], a[3]);
+        a[0] = _mm256_shuffle_ps(low01, low23, _MM_SHUFFLE(1, 0, 1, 0));
+        a[1] = _mm256_shuffle_ps(low01, low23, _MM_SHUFFLE(3, 2, 3, 2));
+        a[2] = _mm256_shuffle_ps(high01, high23, _MM_SHUFFLE(1, 0, 1, 0));
+        a[3] = _mm256_shuffle_ps(high01, high23, _MM_SHUFFLE(3, 2, 3, 2));
+    }
+
     static Vector evenLanes(Vector a) { return _mm256_moveldup_ps(a); }
     static Vector oddLanes(Vector a) { return _mm256_movehdup_ps(a); }
     static Vector swapPairs(Vector a) { return _mm256_permute_ps(a, _MM_SHUFFLE(2, 3, 0, 1)); }
     static Vector subtractAdd(Vector a, Vector b) { return _mm256_addsub_ps(a, b); }
 
 private:
+    static void exchangeHalves(Vector& a, Vector& b) {
+        const Vector low = _mm256_permute2f128_ps(a, b, 0x20);
+        b = _mm256_permute2f128_ps(a, b, 0x31);
+        a = low;
+    }
     static Vector pair(const float* low, const float* high) {
         return _mm256_insertf128_ps(_mm256_castps128_ps256(_mm_loadu_ps(low)), _mm_loadu_ps(high),
                                     1);
@@ -187,6 +209,9 @@ struct Lanes16 {
         exchangeQuarters(a[2], a[6], a[10], a[14]);
         exchangeQuarters(a[3], a[7], a[11], a[15]);
     }
+
+    static void exchangeQuarters(Vector (&a)[4]) { exchangeQuarters(a[0], a[1], a[2], a[3]); }
+    static void transposeQuarters(Vector (&a)[4]) { transposeQuarters(a[0], a[1], a[2], a[3]); }
 
     static Vector evenLanes(Vector a) { return _mm512_moveldup_ps(a); }
     static Vector oddLanes(Vector a) { return _mm512_movehdup_ps(a); }

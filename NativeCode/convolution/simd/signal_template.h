@@ -10,7 +10,7 @@
 //   each pair), add, multiply, multiplyAdd(a, b, c) = a b + c.
 #pragma once
 
-#include "convolution/simd/kernel_template.h"
+#include "convolution/simd/complex_lanes.h"
 #include "convolution/simd/signal_kernels.h"
 
 namespace tessaly {

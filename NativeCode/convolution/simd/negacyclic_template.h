@@ -1,0 +1,488 @@
+// The transform of overlap-save blocks and the sums of their products, written once over a lane
+// type.
+//
+// Only the second half of a block's result is heard, so it may be made by any product of
+// polynomials that leaves this half alone: with u^M = i in place of u^(2M) = 1 a window of 2M reals
+// is M complex points, first half + i second half, and its spectrum the values at the M roots. (The
+// right-angle circular convolution of Nussbaumer, "Fast Fourier Transform and Convolution
+// Algorithms", 1982.) Points need no packing and bins no parting, and bins stay in the order in
+// which the passes leave them.
+//
+// The points lie in K = M / L rows of L lanes. Passes down the rows split the ring u^M - c into
+// rings of a quarter of the degree, until each row is one of degree L; a pass across the lanes ends
+// each of them. A ring is split by multiplying with powers of a root of c before the butterfly: a
+// constant for all of it, no factor for each point.
+#pragma once
+
+#include "convolution/simd/complex_lanes.h"
+
+namespace tessaly {
+namespace {
+
+/// A window of 2M samples, row by row.
+template <class Lanes>
+struct WindowSource {
+    static constexpr bool real = false;
+    const float* samples;
+    Index points;
+
+    TESSALY_KERNEL_INLINE Complex<Lanes> operator()(Index row) const {
+        const float* at = samples + Lanes::count * row;
+        return {Lanes::load(at), Lanes::load(at + points)};
+    }
+};
+
+/// M samples that M zeros follow: no imaginary parts.
+template <class Lanes>
+struct StartSource {
+    static constexpr bool real = true;
+    const float* samples;
+
+    TESSALY_KERNEL_INLINE Complex<Lanes> operator()(Index row) const {
+        return {Lanes::load(samples + Lanes::count * row), Lanes::broadcast(0.0f)};
+    }
+};
+
+template <class Lanes>
+struct RowSource {
+    static constexpr bool real = false;
+    const float* rows;
+
+    TESSALY_KERNEL_INLINE Complex<Lanes> operator()(Index row) const {
+        return loadGroup<Lanes>(rows, row);
+    }
+};
+
+template <class Lanes, Index Radix>
+TESSALY_KERNEL_INLINE void transformRows(Complex<Lanes> (&x)[Radix]) {
+    if constexpr (Radix == 2) {
+        transform2(x[0], x[1]);
+    } else if constexpr (Radix == 4) {
+        transform4(x[0], x[1], x[2], x[3]);
+    } else {
+        transform8(x);
+    }
+}
+
+/// Splits each of `rings` rings of n rows into `Radix`. In place, but for the first pass.
+template <class Lanes, Index Radix, class Source>
+TESSALY_KERNEL_INLINE void splitRings(
+    const Source& source, float* rows, Index n, Index rings, const float* roots) {
+    const Index step = n / Radix;
+    for (Index ring = 0; ring < rings; ++ring) {
+        Complex<Lanes> root[Radix];
+        TESSALY_KERNEL_UNROLL
+        for (Index t = 1; t < Radix; ++t) {
+            root[t] = broadcastRoot<Lanes>(roots + 2 * (t - 1));
+        }
+        roots += 2 * (Radix - 1);
+        for (Index p = ring * n; p < ring * n + step; ++p) {
+            Complex<Lanes> x[Radix];
+            x[0] = source(p);
+            TESSALY_KERNEL_UNROLL
+            for (Index t = 1; t < Radix; ++t) {
+                const Complex<Lanes> value = source(p + t * step);
+                if constexpr (Source::real) {
+                    x[t] = {Lanes::multiply(value.re, root[t].re),
+                            Lanes::multiply(value.re, root[t].im)};
+                } else {
+                    x[t] = value * root[t];
+                }
+            }
+            transformRows<Lanes, Radix>(x);
+            TESSALY_KERNEL_UNROLL
+            for (Index t = 0; t < Radix; ++t) {
+                storeGroup(rows, p + t * step, x[t]);
+            }
+        }
+    }
+}
+
+/// Passes take four rings at once; the one on the shortest rings two, four or eight.
+template <class Lanes, class Source>
+TESSALY_KERNEL_INLINE void splitShortest(
+    const Source& source, float* rows, Index n, Index rings, const float* roots) {
+    if (n == 8) {
+        splitRings<Lanes, 8>(source, rows, n, rings, roots);
+    } else if (n == 4) {
+        splitRings<Lanes, 4>(source, rows, n, rings, roots);
+    } else {
+        splitRings<Lanes, 2>(source, rows, n, rings, roots);
+    }
+}
+
+template <class Lanes, class Source>
+void splitAll(const BlockTables& tables, const Source& source, float* rows) {
+    const float* roots = tables.rings;
+    Index n = tables.columns;
+    if (n <= 8) {
+        splitShortest<Lanes>(source, rows, n, 1, roots);
+        return;
+    }
+    splitRings<Lanes, 4>(source, rows, n, 1, roots);
+    roots += 6;
+    Index rings = 4;
+    n /= 4;
+    for (; n > 8; n /= 4) {
+        splitRings<Lanes, 4>(RowSource<Lanes>{rows}, rows, n, rings, roots);
+        roots += 6 * rings;
+        rings *= 4;
+    }
+    splitShortest<Lanes>(RowSource<Lanes>{rows}, rows, n, rings, roots);
+}
+
+/// The passes across the lanes work on four rows at a time, which is what the registers hold
+/// without spilling: rings of L / 4 groups of four lanes are split first, with the groups of four
+/// lanes of several rows side by side, and then the remaining ones of four.
+constexpr Index rowsAcross = 4;
+
+template <class Lanes, class Function>
+TESSALY_KERNEL_INLINE void onParts(Complex<Lanes> (&x)[rowsAcross], const Function& function) {
+    typename Lanes::Vector re[rowsAcross] = {x[0].re, x[1].re, x[2].re, x[3].re};
+    typename Lanes::Vector im[rowsAcross] = {x[0].im, x[1].im, x[2].im, x[3].im};
+    function(re);
+    function(im);
+    TESSALY_KERNEL_UNROLL
+    for (Index k = 0; k < rowsAcross; ++k) {
+        x[k] = {re[k], im[k]};
+    }
+}
+
+/// Lane groups k of four rows (or of each pair of rows) come together as x[k], and back.
+template <class Lanes>
+TESSALY_KERNEL_INLINE void exchangeQuarters(Complex<Lanes> (&x)[rowsAcross]) {
+    onParts(x, [](auto& part) { Lanes::exchangeQuarters(part); });
+}
+/// Four by four, within each group of four lanes.
+template <class Lanes>
+TESSALY_KERNEL_INLINE void transposeQuarters(Complex<Lanes> (&x)[rowsAcross]) {
+    onParts(x, [](auto& part) { Lanes::transposeQuarters(part); });
+}
+
+/// The roots that four rows take, in groups, in front of the butterflies between quarters and in
+/// front of those within.
+template <Index Lanes>
+constexpr Index quarterRoots = Lanes == 16  ? 3
+                               : Lanes == 8 ? 2
+                                            : 0;
+constexpr Index innerRoots = 3;
+
+template <class Lanes>
+TESSALY_KERNEL_INLINE void timesQuarterRoots(Complex<Lanes> (&x)[rowsAcross], const float* roots) {
+    if constexpr (Lanes::count == 16) {
+        x[1] = x[1] * loadGroup<Lanes>(roots, 0);
+        x[2] = x[2] * loadGroup<Lanes>(roots, 1);
+        x[3] = x[3] * loadGroup<Lanes>(roots, 2);
+    } else if constexpr (Lanes::count == 8) {
+        x[1] = x[1] * loadGroup<Lanes>(roots, 0);
+        x[3] = x[3] * loadGroup<Lanes>(roots, 1);
+    }
+}
+template <class Lanes>
+TESSALY_KERNEL_INLINE void timesInnerRoots(Complex<Lanes> (&x)[rowsAcross], const float* roots) {
+    x[1] = x[1] * loadGroup<Lanes>(roots, 0);
+    x[2] = x[2] * loadGroup<Lanes>(roots, 1);
+    x[3] = x[3] * loadGroup<Lanes>(roots, 2);
+}
+template <class Lanes>
+TESSALY_KERNEL_INLINE void transformQuarters(Complex<Lanes> (&x)[rowsAcross]) {
+    if constexpr (Lanes::count == 16) {
+        transform4(x[0], x[1], x[2], x[3]);
+    } else if constexpr (Lanes::count == 8) {
+        transform2(x[0], x[1]);
+        transform2(x[2], x[3]);
+    }
+}
+
+/// The last pass of a forward transform, in place.
+template <class Lanes>
+void splitAcross(const BlockTables& tables, float* rows) {
+    constexpr Index count = Lanes::count;
+    const float* roots = tables.across;
+    for (Index row = 0; row < tables.columns; row += rowsAcross) {
+        Complex<Lanes> x[rowsAcross];
+        TESSALY_KERNEL_UNROLL
+        for (Index k = 0; k < rowsAcross; ++k) {
+            x[k] = loadGroup<Lanes>(rows, row + k);
+        }
+        exchangeQuarters(x);
+        timesQuarterRoots(x, roots);
+        transformQuarters(x);
+        transposeQuarters(x);
+        timesInnerRoots(x, roots + 2 * count * quarterRoots<count>);
+        transform4(x[0], x[1], x[2], x[3]);
+        roots += 2 * count * (quarterRoots<count> + innerRoots);
+        TESSALY_KERNEL_UNROLL
+        for (Index k = 0; k < rowsAcross; ++k) {
+            storeGroup(rows, row + k, x[k]);
+        }
+    }
+}
+
+/// The first pass of a backward transform. Real and imaginary parts change places, so that the
+/// forward butterflies and roots make all of it.
+template <class Lanes>
+void joinAcross(const BlockTables& tables, const float* bins, float* rows) {
+    constexpr Index count = Lanes::count;
+    const float* roots = tables.across;
+    for (Index row = 0; row < tables.columns; row += rowsAcross) {
+        Complex<Lanes> x[rowsAcross];
+        TESSALY_KERNEL_UNROLL
+        for (Index k = 0; k < rowsAcross; ++k) {
+            const Complex<Lanes> value = loadGroup<Lanes>(bins, row + k);
+            x[k] = {value.im, value.re};
+        }
+        transform4(x[0], x[1], x[2], x[3]);
+        timesInnerRoots(x, roots + 2 * count * quarterRoots<count>);
+        transposeQuarters(x);
+        transformQuarters(x);
+        timesQuarterRoots(x, roots);
+        exchangeQuarters(x);
+        roots += 2 * count * (quarterRoots<count> + innerRoots);
+        TESSALY_KERNEL_UNROLL
+        for (Index k = 0; k < rowsAcross; ++k) {
+            storeGroup(rows, row + k, x[k]);
+        }
+    }
+}
+
+/// Intermediate rows of a backward transform.
+template <class Lanes>
+struct RowSink {
+    float* rows;
+
+    TESSALY_KERNEL_INLINE void first(Index row, const Complex<Lanes>& value) const {
+        storeGroup(rows, row, value);
+    }
+    TESSALY_KERNEL_INLINE void other(Index row,
+                                     const Complex<Lanes>& value,
+                                     const Complex<Lanes>& root) const {
+        storeGroup(rows, row, value * root);
+    }
+};
+
+/// The second half of the samples; the first one is not made. Twice the value: a window and its
+/// spectrum count 2M.
+template <class Lanes>
+struct BlockSink {
+    float* samples;
+
+    TESSALY_KERNEL_INLINE void first(Index row, const Complex<Lanes>& value) const {
+        Lanes::store(samples + Lanes::count * row, Lanes::add(value.re, value.re));
+    }
+    TESSALY_KERNEL_INLINE void other(Index row,
+                                     const Complex<Lanes>& value,
+                                     const Complex<Lanes>& root) const {
+        const auto re =
+            Lanes::multiplySubtract(value.re, root.re, Lanes::multiply(value.im, root.im));
+        Lanes::store(samples + Lanes::count * row, Lanes::add(re, re));
+    }
+};
+
+/// The first value of a butterfly, in its order.
+template <class Lanes, Index Radix>
+TESSALY_KERNEL_INLINE Complex<Lanes> sumOfRows(const float* rows, Index first, Index step) {
+    if constexpr (Radix == 1) {
+        return loadGroup<Lanes>(rows, first);
+    } else {
+        return sumOfRows<Lanes, Radix / 2>(rows, first, 2 * step) +
+               sumOfRows<Lanes, Radix / 2>(rows, first + step, 2 * step);
+    }
+}
+
+/// Joins `Radix` rings of a `Radix`th of n rows each into one, `rings` times. Of each one's rows
+/// those below `wanted` at least are made.
+template <class Lanes, Index Radix, class Sink>
+TESSALY_KERNEL_INLINE void joinRings(
+    const float* rows, const Sink& sink, Index n, Index rings, Index wanted, const float* roots) {
+    const Index step = n / Radix;
+    if (wanted <= step) {
+        for (Index ring = 0; ring < rings; ++ring) {
+            for (Index p = ring * n; p < ring * n + wanted; ++p) {
+                sink.first(p, sumOfRows<Lanes, Radix>(rows, p, step));
+            }
+        }
+        return;
+    }
+    for (Index ring = 0; ring < rings; ++ring) {
+        Complex<Lanes> root[Radix];
+        TESSALY_KERNEL_UNROLL
+        for (Index t = 1; t < Radix; ++t) {
+            root[t] = broadcastRoot<Lanes>(roots + 2 * (t - 1));
+        }
+        roots += 2 * (Radix - 1);
+        for (Index p = ring * n; p < ring * n + step; ++p) {
+            Complex<Lanes> x[Radix];
+            TESSALY_KERNEL_UNROLL
+            for (Index t = 0; t < Radix; ++t) {
+                x[t] = loadGroup<Lanes>(rows, p + t * step);
+            }
+            transformRows<Lanes, Radix>(x);
+            sink.first(p, x[0]);
+            TESSALY_KERNEL_UNROLL
+            for (Index t = 1; t < Radix; ++t) {
+                sink.other(p + t * step, x[t], root[t]);
+            }
+        }
+    }
+}
+
+template <class Lanes, class Sink>
+TESSALY_KERNEL_INLINE void joinShortest(
+    const float* rows, const Sink& sink, Index n, Index rings, Index wanted, const float* roots) {
+    if (n == 8) {
+        joinRings<Lanes, 8>(rows, sink, n, rings, wanted, roots);
+    } else if (n == 4) {
+        joinRings<Lanes, 4>(rows, sink, n, rings, wanted, roots);
+    } else {
+        joinRings<Lanes, 2>(rows, sink, n, rings, wanted, roots);
+    }
+}
+
+/// All passes down the rows, in place but for the last one. `wanted` rows of the result are made at
+/// least.
+template <class Lanes>
+void joinAll(const BlockTables& tables, float* rows, float* samples, Index wanted) {
+    const BlockSink<Lanes> result{samples};
+    const RowSink<Lanes> between{rows};
+    Index n = tables.columns;
+    Index rings = 1;
+    const float* roots = tables.rings;
+    while (n > 8) {
+        roots += 6 * rings;
+        rings *= 4;
+        n /= 4;
+    }
+    if (rings == 1) {
+        joinShortest<Lanes>(rows, result, n, rings, wanted, roots);
+        return;
+    }
+    joinShortest<Lanes>(rows, between, n, rings, wanted, roots);
+    for (;;) {
+        n *= 4;
+        rings /= 4;
+        roots -= 6 * rings;
+        if (rings == 1) {
+            joinRings<Lanes, 4>(rows, result, n, rings, wanted, roots);
+            return;
+        }
+        joinRings<Lanes, 4>(rows, between, n, rings, wanted, roots);
+    }
+}
+
+template <class Lanes>
+void windowLanes(const BlockTables& tables, const float* input, ComplexBin* bins) {
+    splitAll<Lanes>(tables, WindowSource<Lanes>{input, tables.points}, floats(bins));
+    if constexpr (Lanes::count > 1) {
+        splitAcross<Lanes>(tables, floats(bins));
+    }
+}
+
+template <class Lanes>
+void partitionLanes(const BlockTables& tables, const float* input, ComplexBin* bins) {
+    splitAll<Lanes>(tables, StartSource<Lanes>{input}, floats(bins));
+    if constexpr (Lanes::count > 1) {
+        splitAcross<Lanes>(tables, floats(bins));
+    }
+}
+
+template <class Lanes>
+void blockLanes(const BlockTables& tables,
+                const ComplexBin* bins,
+                float* output,
+                float* work,
+                std::size_t samples) {
+    constexpr Index count = Lanes::count;
+    if constexpr (count > 1) {
+        joinAcross<Lanes>(tables, floats(bins), work);
+    } else {
+        for (Index k = 0; k < tables.points; ++k) {
+            storeGroup(work, k, Complex<Lanes>{bins[k].im, bins[k].re});
+        }
+    }
+    joinAll<Lanes>(tables, work, output, (static_cast<Index>(samples) + count - 1) / count);
+}
+
+// ---- Sums of products of such spectra ----
+
+/// Adds `Group` products to what `base` holds, or to nothing.
+template <class Lanes, int Group>
+void sumRows(std::size_t rows,
+             const float* const (&input)[Group],
+             const float* const (&left)[Group],
+             const float* const (&right)[Group],
+             const float* baseL,
+             const float* baseR,
+             float* sumL,
+             float* sumR) {
+    for (std::size_t k = 0; k < rows; ++k) {
+        const auto j = static_cast<Index>(k);
+        const auto zero = Complex<Lanes>{Lanes::broadcast(0.0f), Lanes::broadcast(0.0f)};
+        Complex<Lanes> l = baseL != nullptr ? loadGroup<Lanes>(baseL, j) : zero;
+        Complex<Lanes> r = baseR != nullptr ? loadGroup<Lanes>(baseR, j) : zero;
+        TESSALY_KERNEL_UNROLL
+        for (int g = 0; g < Group; ++g) {
+            const Complex<Lanes> x = loadGroup<Lanes>(input[g], j);
+            const auto add = [&x](Complex<Lanes>& sum, const Complex<Lanes>& h) {
+                sum.re = Lanes::multiplyAdd(x.re, h.re, sum.re);
+                sum.im = Lanes::multiplyAdd(x.re, h.im, sum.im);
+                sum.re = Lanes::negateMultiplyAdd(x.im, h.im, sum.re);
+                sum.im = Lanes::multiplyAdd(x.im, h.re, sum.im);
+            };
+            add(l, loadGroup<Lanes>(left[g], j));
+            add(r, loadGroup<Lanes>(right[g], j));
+        }
+        storeGroup(sumL, j, l);
+        storeGroup(sumR, j, r);
+    }
+}
+
+/// Products are taken four at a time: twelve streams of memory keep the prefetchers busy, and the
+/// sums, which stay in the nearest cache, are touched once for four products.
+template <class Lanes>
+void sumProducts(std::size_t bins,
+                 std::size_t count,
+                 const ComplexBin* const* input,
+                 const ComplexBin* const* left,
+                 const ComplexBin* const* right,
+                 const ComplexBin* baseL,
+                 const ComplexBin* baseR,
+                 ComplexBin* sumL,
+                 ComplexBin* sumR) {
+    constexpr std::size_t group = 4;
+    const std::size_t rows = bins / static_cast<std::size_t>(Lanes::count);
+    const float* fromL = baseL != nullptr ? floats(baseL) : nullptr;
+    const float* fromR = baseR != nullptr ? floats(baseR) : nullptr;
+    float* const toL = floats(sumL);
+    float* const toR = floats(sumR);
+    const auto take = [&]<int Group>() {
+        const float* x[Group];
+        const float* l[Group];
+        const float* r[Group];
+        TESSALY_KERNEL_UNROLL
+        for (int g = 0; g < Group; ++g) {
+            x[g] = floats(input[g]);
+            l[g] = floats(left[g]);
+            r[g] = floats(right[g]);
+        }
+        sumRows<Lanes, Group>(rows, x, l, r, fromL, fromR, toL, toR);
+        input += Group;
+        left += Group;
+        right += Group;
+        fromL = toL;
+        fromR = toR;
+    };
+    for (; count >= group; count -= group) {
+        take.template operator()<4>();
+    }
+    if (count == 3) {
+        take.template operator()<3>();
+    } else if (count == 2) {
+        take.template operator()<2>();
+    } else if (count == 1) {
+        take.template operator()<1>();
+    }
+}
+
+}  // namespace
+}  // namespace tessaly
