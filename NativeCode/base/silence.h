@@ -10,33 +10,65 @@
 
 namespace tessaly {
 
+namespace detail {
+
+/// The bits of `Count` floats, a multiple of 8, or'ed in pairs.
+template <std::size_t Count>
+std::uint64_t anyBits(const float* samples) noexcept TESSALY_NONBLOCKING {
+#if defined(__GNUC__)
+    using Bits = std::uint64_t __attribute__((vector_size(16)));
+    const auto at = [samples](std::size_t k) noexcept {
+        Bits next;
+        std::memcpy(&next, samples + k, sizeof next);
+        return next;
+    };
+    Bits first = at(0);
+    Bits second = at(4);
+    _Pragma("GCC unroll 8") for (std::size_t k = 8; k < Count; k += 8) {
+        first |= at(k);
+        second |= at(k + 4);
+    }
+    first |= second;
+    return first[0] | first[1];
+#else
+    std::uint64_t any = 0;
+    for (std::size_t k = 0; k < Count; k += 2) {
+        std::uint64_t next = 0;
+        std::memcpy(&next, samples + k, sizeof next);
+        any |= next;
+    }
+    return any;
+#endif
+}
+
+}  // namespace detail
+
 /// True if every value is a zero without sign. A block of sound is left at its first value that is
 /// none, so the question costs next to nothing there. Block time.
 /// @param samples  `count` floats; may be null for a count of 0
 inline bool isSilent(const float* samples, std::size_t count) noexcept TESSALY_NONBLOCKING {
-    if (count == 0) {
-        return true;
+    constexpr std::size_t group = 64;
+    std::size_t i = 0;
+    for (; i + group <= count; i += group) {
+        if (detail::anyBits<group>(samples + i) != 0) {
+            return false;
+        }
     }
-    std::uint32_t first = 0;
-    std::memcpy(&first, samples, sizeof first);
-    // All are zero if the first one is and each of the others equals the one before it.
-    return first == 0 && std::memcmp(samples, samples + 1, (count - 1) * sizeof(float)) == 0;
+    for (; i < count; ++i) {
+        if (std::bit_cast<std::uint32_t>(samples[i]) != 0) {
+            return false;
+        }
+    }
+    return true;
 }
 
 /// All samples are zero, of either sign. Stops soon after the first that is not. Block time.
 inline bool allZero(const float* samples, std::size_t count) noexcept TESSALY_NONBLOCKING {
     constexpr std::size_t group = 64;
-    constexpr std::uint32_t withoutSign = 0x7fffffffu;
-    if (isSilent(samples, count)) {
-        return true;
-    }
+    constexpr std::uint64_t withoutSigns = 0x7fffffff7fffffffu;
     std::size_t i = 0;
     for (; i + group <= count; i += group) {
-        std::uint32_t bits = 0;
-        for (std::size_t k = 0; k < group; ++k) {
-            bits |= std::bit_cast<std::uint32_t>(samples[i + k]);
-        }
-        if ((bits & withoutSign) != 0) {
+        if ((detail::anyBits<group>(samples + i) & withoutSigns) != 0) {
             return false;
         }
     }

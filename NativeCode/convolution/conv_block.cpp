@@ -1,5 +1,6 @@
 // One block of partitioned convolution, plain or with a crossfade.
 #include <algorithm>
+#include <utility>
 
 #include "base/silence.h"
 #include "convolution/conv_class.h"
@@ -22,6 +23,12 @@ float* convClass::process() noexcept {
     return outputL;
 }
 
+void convClass::rest(convClass* taker) noexcept {
+    convClass& owner = taker != nullptr ? *taker : *this;
+    owner.ring_.set(owner.newestSlot(), true, blockNumber());
+    advanceFarTail(true);
+}
+
 /// The number of the block that is being made; 0 where nobody counts.
 std::uint64_t convClass::blockNumber() const noexcept {
     return far_ != nullptr ? far_->block() + 1 : InputRing::noBlock;
@@ -31,8 +38,9 @@ std::uint64_t convClass::blockNumber() const noexcept {
 bool convClass::takeInput(std::uint64_t block) noexcept {
     const std::size_t slot = newestSlot();
     ComplexBin* const spectrum = FDL[slot];
+    const bool known = std::exchange(expectsSilence_, false);
     const bool silent = fftHandle != nullptr && input != nullptr && spectrum != nullptr &&
-                        allZero(input, static_cast<std::size_t>(fftLength));
+                        (known || allZero(input, static_cast<std::size_t>(fftLength)));
     if (silent) {
         if (!ring_.silent(slot)) {
             clearSpectrum(spectrum, binCount - 1);
@@ -80,6 +88,9 @@ convClass::RingView convClass::ownRing() const noexcept {
 
 /// The engine writes the index; one outside of the ring is taken modulo N.
 std::size_t convClass::newestSlot() const noexcept {
+    if (FDLpos >= 0 && FDLpos < FDLtoBUFConv) {
+        return static_cast<std::size_t>(FDLpos);
+    }
     const int slot = FDLpos % FDLtoBUFConv;
     return static_cast<std::size_t>(slot < 0 ? slot + FDLtoBUFConv : slot);
 }

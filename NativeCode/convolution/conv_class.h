@@ -120,6 +120,14 @@ public:
     /// This block's far part came from larger partitions. For tests.
     bool farTailHeard() const noexcept { return farHeard_; }
 
+    /// The window of the next block is known to be zeros. Block time.
+    void expectSilence() noexcept { expectsSilence_ = true; }
+    /// One more block like the last one, which was silent throughout: the input was, all that the
+    /// ring holds and the result, nothing was updated, and it is so again. Results stay as they
+    /// are. Block time.
+    /// @param taker  the second instance if the last block was a crossfade block, else null
+    void rest(convClass* taker) noexcept;
+
     /// The last block's result is zeros for certain.
     bool resultSilent() const noexcept { return resultSilent_; }
 
@@ -272,6 +280,7 @@ private:
     std::vector<std::uint8_t> silent_;  ///< per partition: both spectra are known to be zero
     InputRing ring_;                    ///< of the ring that this instance owns
     bool resultSilent_ = false;
+    bool expectsSilence_ = false;
 
     const convClass* partner_ = nullptr;  ///< the second instance that `processCrossfade` met
     std::unique_ptr<FarTail> far_;

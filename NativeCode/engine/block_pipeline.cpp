@@ -1,5 +1,6 @@
 // The order of a block, and no arithmetic of its own.
 #include <algorithm>
+#include <utility>
 
 #include "base/ess_error.h"
 #include "base/log.h"
@@ -9,12 +10,14 @@
 #include "engine/room_geometry.h"
 #include "engine/shared_state.h"
 #include "engine/spatial_engine.h"
+#include "resources/hrir_tables.h"
 
 namespace tessaly {
 
 namespace {
 
 constexpr float forcedInterpAngleOffset = 2.5f;  // degrees, half a grid step
+constexpr std::uint32_t silencePatience = 16;    // blocks before silence is relied on
 
 void moveReflections(EngineState& state) noexcept {
     if (state.switches.qvFlexReflections && state.switches.qvTrackDirection) {
@@ -86,14 +89,13 @@ bool isCrossfadeBlock(const EngineState& state) noexcept {
 /// Neither this block's window nor the ring it is convolved with holds a sound, and has not for a
 /// while: waking from a response that was put off costs more than a usual block.
 bool watchSilence(EngineState& state) noexcept {
-    constexpr std::uint32_t patience = 16;  // blocks
     const convClass& heard = isCrossfadeBlock(state) ? *state.secondOLS : *state.firstOLS;
     const bool silent =
         state.frontEnd.seesSilence(state.inBlock, state.inputChannel, state.controls.bassBoost,
                                    state.switches.doppler) &&
         heard.pastSilent() && essError == essErrorNone;
-    state.silentBlocks = silent ? std::min(state.silentBlocks + 1, patience + 1) : 0;
-    return state.silentBlocks > patience;
+    state.silentBlocks = silent ? std::min(state.silentBlocks + 1, silencePatience + 1) : 0;
+    return state.silentBlocks > silencePatience;
 }
 
 CompositionInputs compositionInputs(EngineState& state) noexcept {
@@ -117,18 +119,23 @@ void composeResponse(EngineState& state) noexcept {
 
 void advanceRings(EngineState& state) noexcept {
     convClass& first = *state.firstOLS;
-    first.FDLpos = static_cast<std::int16_t>((first.FDLpos + 1) % state.sizes.fdlCount);
+    const int next = first.FDLpos + 1;
+    const int count = state.sizes.fdlCount;
+    first.FDLpos = static_cast<std::int16_t>(next < count ? next : next % count);
     if (state.secondOLS != nullptr) {
         state.secondOLS->FDLpos = first.FDLpos;
     }
 }
 
-void convolve(EngineState& state) {
+void convolve(EngineState& state, bool crossfade) {
     if (essError != essErrorNone) {
         logOutput("Tessaly_e ERROR: no comProcessing due to essError: ", essError);
         return;
     }
-    if (isCrossfadeBlock(state)) {
+    if (state.frontEnd.windowSilent()) {
+        (crossfade ? *state.secondOLS : *state.firstOLS).expectSilence();
+    }
+    if (crossfade) {
         state.output.secondOLSactive = true;
         state.firstOLS->processCrossfade(*state.secondOLS, OutputStage::crossfadeLength);
     } else {
@@ -167,6 +174,66 @@ void outputStage(EngineState& state) {
     state.direction.holdInterpPair = false;
 }
 
+BlockInputs readInputs(const EngineState& state) noexcept {
+    return {**state.phiIn,
+            **state.thetaIn,
+            **state.distanceIn,
+            **state.gainDb,
+            state.frontEnd.inputLowPassLevel,
+            qvHpTFcompSelect,
+            state.liveSettings->qvHpTFcompSelect,
+            hrirStreamNumber,
+            hrirTablesVersion,
+            *state.mixParameters,
+            state.controls};
+}
+
+/// As `readInputs(state) == inputs`, without making the former.
+bool readsTheSame(const EngineState& state, const BlockInputs& inputs) noexcept {
+    return **state.phiIn == inputs.phi && **state.thetaIn == inputs.theta &&
+           **state.distanceIn == inputs.distance && **state.gainDb == inputs.gainDb &&
+           state.frontEnd.inputLowPassLevel == inputs.inputLowPassLevel &&
+           qvHpTFcompSelect == inputs.headphoneSelection &&
+           state.liveSettings->qvHpTFcompSelect == inputs.liveHeadphoneSelection &&
+           hrirStreamNumber == inputs.hrirStream && hrirTablesVersion == inputs.hrirTables &&
+           *state.mixParameters == inputs.mix && state.controls == inputs.controls;
+}
+
+/// Of the engine's own switches: nothing in it counts blocks or looks a window up on its own.
+bool mayRest(const EngineState& state) noexcept {
+    return !state.switches.doppler && !state.switches.interpolateAngles &&
+           state.switches.qvUpdateInterval <= 1 && state.settings.debugDump == 0;
+}
+
+/// Flags of the process that ask for something.
+bool nothingIsAsked() noexcept {
+    return !filterChangeAll && !forceUpdateAll && !hpTFactive && essError == essErrorNone &&
+           blockCounter != 0;
+}
+
+/// @param crossfade  the block that was made is one
+void noteRest(EngineState& state, bool crossfade) noexcept {
+    const bool quiet = state.silentBlocks > silencePatience && state.firstOLS->resultSilent() &&
+                       state.frontEnd.windowSilent() && mayRest(state) && nothingIsAsked() &&
+                       state.output.keepsSilence(state.switches.atmoSelect);
+    if (quiet) {
+        state.rest.blockMade(true, readInputs(state), crossfade);
+    } else {
+        state.rest.forget();
+    }
+}
+
+/// As a block in full would leave it.
+void restForABlock(EngineState& state) noexcept {
+    advanceRings(state);
+    state.firstOLS->rest(state.rest.crossfade() ? state.secondOLS.get() : nullptr);
+    std::fill_n(state.outBlock, std::size_t{2} * static_cast<std::size_t>(state.sizes.blocklenght),
+                0.0f);
+    if (state.instanceNumber >= engineCount - 1) {
+        ++blockCounter;
+    }
+}
+
 /// Silence of an engine whose construction stopped.
 void renderNothing(const EngineState& state, float* output) {
     if (essError != essErrorNone) {
@@ -188,6 +255,7 @@ void catchUpWithResponse(EngineState& state) noexcept {
 }
 
 void processEngineBlock(EngineState& state, float*& input, float*& output) {
+    const bool expectsSilence = std::exchange(state.expectsSilence, false);
     if (input == nullptr) {
         logTrace("ERROR: Buffer-Input problem!!!");
         return;
@@ -202,6 +270,13 @@ void processEngineBlock(EngineState& state, float*& input, float*& output) {
     state.inBlock = input;
     state.outBlock = output;
     state.inputChannel = 0;
+    if (expectsSilence) {
+        if (state.rest.settled() && nothingIsAsked() && readsTheSame(state, state.rest.inputs())) {
+            restForABlock(state);
+            return;
+        }
+        state.frontEnd.expectSilence();
+    }
     if (state.instanceNumber == 0) {
         watchHeadphoneSelection(state.liveSettings->qvHpTFcompSelect, state.sizes.FIR_size,
                                 state.sizes.blocklenght, state.bundleBasePath);
@@ -225,10 +300,12 @@ void processEngineBlock(EngineState& state, float*& input, float*& output) {
         state.law.dopplerPitch = 1.0f;  // the delay line has done the shift
     }
     advanceRings(state);
-    convolve(state);
+    const bool crossfade = isCrossfadeBlock(state);
+    convolve(state, crossfade);
     filterChangeAll = false;
     forceUpdateAll = false;
     outputStage(state);
+    noteRest(state, crossfade);
 
     if (state.instanceNumber >= engineCount - 1) {
         ++blockCounter;
@@ -247,6 +324,8 @@ bool SpatialEngine::comProcessing(float*& input, float*& output, std::int16_t /*
     processEngineBlock(*state_, input, output);
     return true;
 }
+
+void SpatialEngine::expectSilence() noexcept { state_->expectsSilence = true; }
 
 float SpatialEngine::setInputLowPass(float level) noexcept {
     return state_->frontEnd.setInputLowPass(level);

@@ -373,6 +373,7 @@ int SpatialEngine::Stop() {
     state.composer.filterLeftBuffer.clear();
     state.composer.filterRightBuffer.clear();
     state.composer.forget();
+    state.rest.forget();
     state.output.clear();
     if (state.firstOLS != nullptr) {
         state.firstOLS->clearFDL();

@@ -95,12 +95,7 @@ void settleAmbience(EffectiveSettings& effective, std::int16_t instanceNumber, i
 }  // namespace
 
 bool mixParametersDiffer(const MixParameters& a, const MixParameters& b) noexcept {
-    // An unordered comparison counts as a difference: NaN != NaN holds.
-    return a.directGain != b.directGain || a.earlyGain != b.earlyGain ||
-           a.reverbGain != b.reverbGain || a.mixCutoffSlot != b.mixCutoffSlot ||
-           a.reverbCutoff != b.reverbCutoff || a.mixSlot != b.mixSlot ||
-           a.unityAttenuation != b.unityAttenuation || a.unityDistance != b.unityDistance ||
-           a.mixRoomSlot != b.mixRoomSlot || a.roomSize != b.roomSize;
+    return !(a == b);  // an unordered comparison counts as a difference
 }
 
 void setQualitySettings(const EngineSettings& settings,

@@ -53,6 +53,8 @@ struct MixParameters {
     std::uint8_t unityDistance = 0;  ///< 1: the host's attenuation replaces the distance law
     float mixRoomSlot = 40.0f;
     float roomSize = 1.0f;  ///< kept by handlers with `alwaysUpdateFilter` off
+
+    bool operator==(const MixParameters&) const = default;
 };
 
 /// The switches the engine tests: the settings, or the quality ladder's choice.

@@ -17,6 +17,7 @@
 #include "engine/live_controls.h"
 #include "engine/output_stage.h"
 #include "engine/reflections.h"
+#include "engine/rest_state.h"
 #include "engine/reverb_tail.h"
 #include "engine/source_direction.h"
 #include "resources/hrir_database.h"
@@ -53,6 +54,8 @@ struct EngineState {
     float* outBlock = nullptr;
     std::int16_t inputChannel = 0;
     std::uint32_t silentBlocks = 0;  ///< in a row, of input and rings; stops counting soon
+    bool expectsSilence = false;     ///< the next block's input is known to be zeros
+    RestState rest;
 
     SourceDirection direction;
     DistanceLaw law;

@@ -49,9 +49,9 @@ bool isAtRest(const Biquad& filter) noexcept {
 }
 
 /// As allZero, for one channel of stereo frames.
-bool channelSilent(const float* channel, int frames) noexcept {
+bool channelSilent(const SignalKernels& kernels, const float* channel, int frames) noexcept {
     // Both channels mostly are, and side by side they are looked through faster.
-    if (frames > 0 && isSilent(channel, 2 * static_cast<std::size_t>(frames) - 1)) {
+    if (frames > 0 && kernels.isSilent(2 * static_cast<std::size_t>(frames) - 1, channel)) {
         return true;
     }
     constexpr int together = 16;  // frames between two looks at the result
@@ -140,7 +140,7 @@ void InputFrontEnd::prepareWindow(int blocklenght) {
 
 bool InputFrontEnd::staysAtRest(const float* channel, bool bassBoost, bool dopplerOn) noexcept {
     return !dopplerOn && chainOf(*this, bassBoost).isAtRest() &&
-           channelSilent(channel, blocklenght_);
+           (expectsSilence_ || channelSilent(*kernels_, channel, blocklenght_));
 }
 
 bool InputFrontEnd::seesSilence(const float* input,
@@ -170,6 +170,7 @@ void InputFrontEnd::process(const float* input,
     const bool silence = ahead_ == Ahead::Unknown ? staysAtRest(channel, bassBoost, dopplerOn)
                                                   : ahead_ == Ahead::Silence;
     ahead_ = Ahead::Unknown;
+    expectsSilence_ = false;
     if (silence) {
         chain.clear();
         keepSilence();

@@ -18,6 +18,11 @@ public:
     /// Load time: allocates the window of 2 * `blocklenght` floats.
     void prepareWindow(int blocklenght);
 
+    /// The next block is known to be zeros. Block time.
+    void expectSilence() noexcept { expectsSilence_ = true; }
+    /// All of the window is zeros. Block time.
+    bool windowSilent() const noexcept { return silentBlocks_ == 2; }
+
     /// Whether the next call of `process`, with the same arguments, leaves nothing but zeros in the
     /// window. Only redesigns of the distance filters may come between. Block time.
     bool seesSilence(const float* input,
@@ -66,6 +71,7 @@ private:
     /// What `seesSilence` found in the block that `process` has not taken yet.
     enum class Ahead : std::uint8_t { Unknown, Silence, Sound };
     Ahead ahead_ = Ahead::Unknown;
+    bool expectsSilence_ = false;  ///< of the block that `process` has not taken yet
     int sampleRate_ = 0;
     int blocklenght_ = 0;
 };

@@ -15,6 +15,8 @@ struct LiveControls {
     bool bassBoost = false;             ///< run the low shelf on the input
     /// Metres: above, below, front, back, positive side, negative side; -1: no such wall.
     std::array<float, 6> roomDistances = {1.0f, 1.0f, 1.0f, 1.0f, 1.0f, 1.0f};
+
+    bool operator==(const LiveControls&) const = default;
 };
 
 }  // namespace tessaly

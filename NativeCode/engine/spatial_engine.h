@@ -53,6 +53,10 @@ public:
     /// @return true always; with a null input nothing is written
     bool comProcessing(float*& input, float*& output, std::int16_t slot) TESSALY_NONBLOCKING;
 
+    /// The next call of `comProcessing` has an input of nothing but zeros, both channels: the
+    /// engine need not look. Block time.
+    void expectSilence() noexcept TESSALY_NONBLOCKING;
+
     /// Occlusion, 0 to 1: designs the input low-pass from 20000 down to 200 Hz. Block time.
     /// @return the former level
     float setInputLowPass(float level) noexcept TESSALY_NONBLOCKING;

@@ -190,6 +190,9 @@ void InstanceHandler::renderBlock(
                   " not existing (yet) cause pluginIDinc is ", pluginId);
         return;
     }
+    if (inputBlockSilent_) {
+        engine->expectSilence();
+    }
     if (out != nullptr && outchannels == 2 && length == blockCapacity) {
         // A whole block needs no copy: the engine has taken its input before it writes.
         float* target = out;
@@ -206,14 +209,14 @@ void InstanceHandler::fillInputBlock(const float* in,
                                      int outchannels) noexcept {
     const bool none = in == nullptr || inchannels <= 0;
     // A flat copy into more than two channels may take more of the input than its first two.
-    inputSilent_ =
-        none || (outchannels <= 2 && isSilent(in, floatsIn(length, std::min(inchannels, 2))));
+    inputSilent_ = none || (outchannels <= 2 &&
+                            kernels_->isSilent(floatsIn(length, std::min(inchannels, 2)), in));
     if (inputSilent_ && inputBlockSilent_) {
         return;
     }
     copyInput(none ? nullptr : in, length, inchannels, outchannels);
     // What is on the odd slots, or behind a shorter block, need not be silent.
-    inputBlockSilent_ = inputSilent_ && isSilent(inputBlock, inputStorage.size());
+    inputBlockSilent_ = inputSilent_ && kernels_->isSilent(inputStorage.size(), inputBlock);
 }
 
 void InstanceHandler::copyInput(const float* in,

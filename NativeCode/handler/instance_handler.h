@@ -9,6 +9,7 @@
 #include "base/aligned_array.h"
 #include "base/audio_thread.h"
 #include "base/linear_level.h"
+#include "convolution/simd/kernels.h"
 #include "engine/engine_settings.h"
 #include "engine/spatial_engine.h"
 
@@ -177,6 +178,7 @@ private:
         std::int16_t azimuth = 0;  ///< 0 degrees stay 0 by any exponent
     };
 
+    const SignalKernels* kernels_ = selectKernels().signal;
     BentAzimuth bentAzimuth_;
     LinearLevel directLevel_;
     LinearLevel earlyLevel_;

@@ -156,8 +156,8 @@ void sendToReverbs(SpatializerEffect& effect,
             {effect.reverbSendId[i], static_cast<float>(effect.reverbSendDb[i])});
     }
     // Silence adds nothing; any other channel count than these two neither.
-    const bool adds =
-        (inchannels == 1 || inchannels == 2) && !isSilent(in, floatsIn(length, inchannels));
+    const bool adds = (inchannels == 1 || inchannels == 2) && !handler.inputWasSilent() &&
+                      !isSilent(in, floatsIn(length, inchannels));
     for (std::size_t i = 0; i < count; ++i) {
         const ReverbSend& send = effect.reverbSends[i];
         ReverbMixBuffer* mix = findMixBuffer(send.id);

@@ -199,6 +199,23 @@ TEST_P(SignalKernelsTest, PairsAreAddedWrittenAndMadeAsByPlainLoops) {
     }
 }
 
+TEST_P(SignalKernelsTest, SilenceIsZerosWithoutASignAndNothingElse) {
+    for (const std::size_t count : {0u, 1u, 3u, 4u, 15u, 64u, 129u, 300u}) {
+        for (const std::size_t offset : {0u, 1u}) {
+            std::vector<float> made(offset + count + 1);
+            made.back() = 1.0f;  // behind the samples
+            ASSERT_TRUE(kernels.isSilent(count, made.data() + offset)) << count;
+            for (std::size_t i = 0; i < count; ++i) {
+                for (const float sound : {1.0f, -0.0f, 1e-45f, std::nanf("")}) {
+                    made[offset + i] = sound;
+                    ASSERT_FALSE(kernels.isSilent(count, made.data() + offset)) << count << i;
+                }
+                made[offset + i] = 0.0f;
+            }
+        }
+    }
+}
+
 INSTANTIATE_TEST_SUITE_P(Tables,
                          SignalKernelsTest,
                          testing::ValuesIn(testableKernels()),

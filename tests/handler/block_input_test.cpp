@@ -77,6 +77,7 @@ TEST_F(BlockInputTest, EqualsThePlainFormOverSoundsAndSilences) {
     PlainInput plain;
     std::vector<float> out(2 * frames);
     int silentBlocks = 0;
+    int toldBlocks = 0;  // all of the engine's input is zeros, and it was told
     for (int block = 0; block < 3000; ++block) {
         SCOPED_TRACE(block);
         if (random() % 200 == 0 && load(block % 2)) {
@@ -112,7 +113,11 @@ TEST_F(BlockInputTest, EqualsThePlainFormOverSoundsAndSilences) {
         const bool silent = sameBits(heard, std::vector<float>(read, 0.0f));
         EXPECT_EQ(handler.inputWasSilent(), silent);
         silentBlocks += silent ? 1 : 0;
+        const bool zeros = sameBits(plain.block, std::vector<float>(plain.block.size(), 0.0f));
+        EXPECT_EQ(fakeEngines().last().blocks.back().silenceExpected, silent && zeros);
+        toldBlocks += silent && zeros ? 1 : 0;
     }
+    EXPECT_GT(toldBlocks, 100);
     EXPECT_GT(silentBlocks, 500);
     EXPECT_LT(silentBlocks, 2500);
 }

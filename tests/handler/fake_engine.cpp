@@ -2,6 +2,7 @@
 #include "handler/fake_engine.h"
 
 #include <algorithm>
+#include <utility>
 
 #include "engine/spatial_engine.h"
 
@@ -75,7 +76,8 @@ bool SpatialEngine::comProcessing(float*& input, float*& output, std::int16_t sl
     const auto floats = 2 * static_cast<std::size_t>(record.blocklenght);
     record.blocks.push_back({**state_->phiIn, **state_->thetaIn, **state_->distanceIn,
                              **state_->gainDb, *record.mixPointer, state_->controls,
-                             std::vector<float>(input, input + floats), slot});
+                             std::vector<float>(input, input + floats), slot,
+                             std::exchange(record.silenceExpected, false)});
     if (test::fakeEngines().render) {
         test::fakeEngines().render(input, output, record.blocklenght);
     } else {
@@ -83,6 +85,8 @@ bool SpatialEngine::comProcessing(float*& input, float*& output, std::int16_t sl
     }
     return true;
 }
+
+void SpatialEngine::expectSilence() noexcept { state_->record->silenceExpected = true; }
 
 float SpatialEngine::setInputLowPass(float level) noexcept {
     auto& levels = state_->record->occlusionLevels;

@@ -23,6 +23,7 @@ struct FakeBlock {
     LiveControls controls;
     std::vector<float> input;  ///< 2 * block length
     int slot = 0;
+    bool silenceExpected = false;  ///< the handler had said that the input is zeros
 };
 
 /// Life of one engine, kept after its end.
@@ -43,6 +44,7 @@ struct FakeEngine {
     std::size_t aliveBefore = 0;  ///< engines alive when this one was built
     bool alive = false;
     std::vector<float> occlusionLevels;
+    bool silenceExpected = false;  ///< of the block to come
     std::vector<FakeBlock> blocks;
 };
 

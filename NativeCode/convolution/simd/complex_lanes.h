@@ -6,7 +6,9 @@
 //   Vector, count (L), load, store, broadcast, add, subtract, multiply,
 //   multiplyAdd(a, b, c) = a b + c, multiplySubtract = a b - c, negateMultiplyAdd = c - a b,
 //   reverse, loadInterleaved / storeInterleaved (2 L floats to and from L real, L imaginary parts),
-//   transpose (L vectors of L),
+//   transpose (L vectors of L), exchangeQuarters and transposeQuarters (four vectors: the groups of
+//   four lanes that rows have in the same place come together; four by four within the groups),
+//   orBits, anyBits (one is set),
 // and for the operations on bins, where a vector holds L / 2 of them, real part first,
 //   evenLanes, oddLanes (each value twice), swapPairs, subtractAdd (- on even lanes, + on odd).
 #pragma once
@@ -28,6 +30,12 @@ using Index = std::ptrdiff_t;
 
 inline const float* floats(const ComplexBin* bins) { return &bins->re; }
 inline float* floats(ComplexBin* bins) { return &bins->re; }
+
+/// By the compilers' own operator: headers of the standard library could leave functions behind
+/// that are built for this instruction set.
+TESSALY_KERNEL_INLINE std::uint32_t bitsOf(float value) {
+    return __builtin_bit_cast(std::uint32_t, value);
+}
 
 /// L complex values: a real and an imaginary vector.
 template <class Lanes>

@@ -48,6 +48,10 @@ struct LanesNeon {
     }
     static void exchangeQuarters(Vector (&)[4]) {}
     static void transposeQuarters(Vector (&a)[4]) { transpose(a); }
+    static Vector orBits(Vector a, Vector b) {
+        return vreinterpretq_f32_u32(vorrq_u32(vreinterpretq_u32_f32(a), vreinterpretq_u32_f32(b)));
+    }
+    static bool anyBits(Vector a) { return vmaxvq_u32(vreinterpretq_u32_f32(a)) != 0; }
 
     static Vector evenLanes(Vector a) { return vtrnq_f32(a, a).val[0]; }
     static Vector oddLanes(Vector a) { return vtrnq_f32(a, a).val[1]; }

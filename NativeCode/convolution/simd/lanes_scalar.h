@@ -20,6 +20,10 @@ struct LanesScalar {
     static Vector multiplySubtract(Vector a, Vector b, Vector c) { return a * b - c; }
     static Vector negateMultiplyAdd(Vector a, Vector b, Vector c) { return c - a * b; }
     static Vector reverse(Vector a) { return a; }
+    static Vector orBits(Vector a, Vector b) {
+        return __builtin_bit_cast(float, bitsOf(a) | bitsOf(b));
+    }
+    static bool anyBits(Vector a) { return bitsOf(a) != 0; }
     static void loadInterleaved(const float* p, Vector& re, Vector& im) {
         re = p[0];
         im = p[1];

@@ -49,6 +49,11 @@ struct Lanes4 {
     static void transpose(Vector (&a)[4]) { _MM_TRANSPOSE4_PS(a[0], a[1], a[2], a[3]); }
     static void exchangeQuarters(Vector (&)[4]) {}
     static void transposeQuarters(Vector (&a)[4]) { transpose(a); }
+    static Vector orBits(Vector a, Vector b) { return _mm_or_ps(a, b); }
+    static bool anyBits(Vector a) {
+        const __m128i zeros = _mm_cmpeq_epi32(_mm_castps_si128(a), _mm_setzero_si128());
+        return _mm_movemask_epi8(zeros) != 0xffff;
+    }
 
     static Vector evenLanes(Vector a) { return _mm_shuffle_ps(a, a, _MM_SHUFFLE(2, 2, 0, 0)); }
     static Vector oddLanes(Vector a) { return _mm_shuffle_ps(a, a, _MM_SHUFFLE(3, 3, 1, 1)); }
@@ -137,6 +142,11 @@ struct Lanes8 {
         a[3] = _mm256_shuffle_ps(high01, high23, _MM_SHUFFLE(3, 2, 3, 2));
     }
 
+    static Vector orBits(Vector a, Vector b) { return _mm256_or_ps(a, b); }
+    static bool anyBits(Vector a) {
+        return _mm256_testz_si256(_mm256_castps_si256(a), _mm256_castps_si256(a)) == 0;
+    }
+
     static Vector evenLanes(Vector a) { return _mm256_moveldup_ps(a); }
     static Vector oddLanes(Vector a) { return _mm256_movehdup_ps(a); }
     static Vector swapPairs(Vector a) { return _mm256_permute_ps(a, _MM_SHUFFLE(2, 3, 0, 1)); }
@@ -212,6 +222,13 @@ struct Lanes16 {
 
     static void exchangeQuarters(Vector (&a)[4]) { exchangeQuarters(a[0], a[1], a[2], a[3]); }
     static void transposeQuarters(Vector (&a)[4]) { transposeQuarters(a[0], a[1], a[2], a[3]); }
+
+    static Vector orBits(Vector a, Vector b) {
+        return _mm512_castsi512_ps(_mm512_or_si512(_mm512_castps_si512(a), _mm512_castps_si512(b)));
+    }
+    static bool anyBits(Vector a) {
+        return _mm512_cmpeq_epi32_mask(_mm512_castps_si512(a), _mm512_setzero_si512()) != 0xffff;
+    }
 
     static Vector evenLanes(Vector a) { return _mm512_moveldup_ps(a); }
     static Vector oddLanes(Vector a) { return _mm512_movehdup_ps(a); }

@@ -54,6 +54,8 @@ struct SignalKernels {
     /// pairs[2i] = even[i] * gain, pairs[2i + 1] = odd[i] * gain.
     void (*interleave)(
         std::size_t frames, const float* even, const float* odd, float gain, float* pairs);
+    /// Every sample is a zero without sign. Of others it is known soon after the first.
+    bool (*isSilent)(std::size_t count, const float* samples);
 };
 
 }  // namespace tessaly

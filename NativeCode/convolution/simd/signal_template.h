@@ -363,6 +363,30 @@ void interleaveLanes(
     }
 }
 
+template <class Lanes>
+bool isSilentLanes(std::size_t count, const float* samples) {
+    constexpr std::size_t lanes = Lanes::count;
+    constexpr std::size_t vectors = 8;  // between two looks at the result
+    std::size_t i = 0;
+    for (; i + vectors * lanes <= count; i += vectors * lanes) {
+        auto first = Lanes::load(samples + i);
+        auto second = Lanes::load(samples + i + lanes);
+        TESSALY_KERNEL_UNROLL
+        for (std::size_t k = 2; k < vectors; k += 2) {
+            first = Lanes::orBits(first, Lanes::load(samples + i + k * lanes));
+            second = Lanes::orBits(second, Lanes::load(samples + i + (k + 1) * lanes));
+        }
+        if (Lanes::anyBits(Lanes::orBits(first, second))) {
+            return false;
+        }
+    }
+    std::uint32_t rest = 0;
+    for (; i < count; ++i) {
+        rest |= bitsOf(samples[i]);
+    }
+    return rest == 0;
+}
+
 /// One table of a kernel source: the widest singles, the widest doubles side by side, the doubles
 /// that look ahead.
 template <class Lanes, class PairLanes, class AheadLanes>
@@ -370,7 +394,8 @@ inline constexpr SignalKernels signalKernelsOf{.filterPairs = filterPairsLanes<P
                                                .filterSeries = filterSeriesLanes<AheadLanes>,
                                                .addPairs = addPairsLanes<Lanes>,
                                                .writePairs = writePairsLanes<Lanes>,
-                                               .interleave = interleaveLanes<Lanes>};
+                                               .interleave = interleaveLanes<Lanes>,
+                                               .isSilent = isSilentLanes<Lanes>};
 
 }  // namespace
 }  // namespace tessaly
