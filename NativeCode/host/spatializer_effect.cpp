@@ -155,9 +155,10 @@ void sendToReverbs(SpatializerEffect& effect,
         effect.reverbSends.push_back(
             {effect.reverbSendId[i], static_cast<float>(effect.reverbSendDb[i])});
     }
-    // Silence adds nothing; any other channel count than these two neither.
-    const bool adds = (inchannels == 1 || inchannels == 2) && !handler.inputWasSilent() &&
-                      !isSilent(in, floatsIn(length, inchannels));
+    // Silence adds nothing; any other channel count than these two neither. What the handler found
+    // does not count: a host may use one buffer for both directions.
+    const bool adds =
+        (inchannels == 1 || inchannels == 2) && !isSilent(in, floatsIn(length, inchannels));
     for (std::size_t i = 0; i < count; ++i) {
         const ReverbSend& send = effect.reverbSends[i];
         ReverbMixBuffer* mix = findMixBuffer(send.id);

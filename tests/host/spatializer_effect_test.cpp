@@ -638,6 +638,20 @@ TEST_F(SpatializerEffectTest, ASendOfALongBlockStaysInItsBuffer) {
     EXPECT_EQ(reverbmixbuffermap[5][2 * 4095], 1.0f);
 }
 
+TEST_F(SpatializerEffectTest, ASourceWithOneBufferForBothDirectionsSendsWhatItRendered) {
+    prepareSend();
+    load();
+    changeMixId(5);
+    // A response that rings on in silence.
+    fakeEngines().render = [](const float*, float* output, int blocklenght) {
+        std::fill_n(output, 2 * blocklenght, 3.0f);
+    };
+    std::vector<float> both(2 * frames, 0.0f);
+    EXPECT_EQ(spatializerProcess(&host.state, both.data(), both.data(), frames, 2, 2), 0);
+    EXPECT_EQ(both[0], 3.0f);
+    EXPECT_EQ(reverbmixbuffermap[5][0], 6.0f);
+}
+
 TEST_F(SpatializerEffectTest, ASendWithoutInputAddsNothing) {
     prepareSend();
     std::vector<float> out(2 * frames, 9.0f);

@@ -45,44 +45,26 @@ struct Stereo1 {
 };
 
 /// Two halves of two registers, which the same code moves about as one.
-struct AheadTwo {
-    using Pair = __m128d;
-    struct Four {
-        Pair low;
-        Pair high;
-    };
+struct AheadLanes2 {
+    using Vector = __m128d;
     static constexpr bool looksAhead = true;
+    static constexpr int lanes = 2;
+    static constexpr int ahead = 4;
 
-    static Pair loadPair(const double* p) { return _mm_loadu_pd(p); }
-    static void storePair(double* p, Pair a) { _mm_storeu_pd(p, a); }
-    static Pair multiply(Pair a, Pair b) { return _mm_mul_pd(a, b); }
-    static Pair add(Pair a, Pair b) { return _mm_add_pd(a, b); }
-    static Pair multiplyAdd(Pair a, Pair b, Pair c) { return _mm_add_pd(_mm_mul_pd(a, b), c); }
-    static Pair swapped(Pair a) { return _mm_shuffle_pd(a, a, 1); }
-
-    static Four loadFour(const double* p) { return {_mm_load_pd(p), _mm_load_pd(p + 2)}; }
-    static Four singles(const float* p) {
-        const __m128 four = _mm_loadu_ps(p);
-        return {_mm_cvtps_pd(four), _mm_cvtps_pd(_mm_movehl_ps(four, four))};
+    static Vector load(const double* p) { return _mm_loadu_pd(p); }
+    static void store(double* p, Vector a) { _mm_storeu_pd(p, a); }
+    static Vector add(Vector a, Vector b) { return _mm_add_pd(a, b); }
+    static Vector multiply(Vector a, Vector b) { return _mm_mul_pd(a, b); }
+    static Vector multiplyAdd(Vector a, Vector b, Vector c) {
+        return _mm_add_pd(_mm_mul_pd(a, b), c);
     }
-    static void storeSingles(float* p, Four a) {
-        _mm_storeu_ps(p, _mm_movelh_ps(_mm_cvtpd_ps(a.low), _mm_cvtpd_ps(a.high)));
+    template <int Lane>
+    static Vector lane(Vector a) {
+        return _mm_shuffle_pd(a, a, Lane * 3);
     }
-    static Four rounded(Four a) {
-        return {_mm_cvtps_pd(_mm_cvtpd_ps(a.low)), _mm_cvtps_pd(_mm_cvtpd_ps(a.high))};
-    }
-    static Pair low(Four a) { return a.low; }
-    static Four lowTwice(Four a) { return {a.low, a.low}; }
-    static Four highTwice(Four a) { return {a.high, a.high}; }
-    static Four twice(Pair a) { return {a, a}; }
-    static Four swapped(Four a) { return {swapped(a.low), swapped(a.high)}; }
-    static Four add(Four a, Four b) { return {add(a.low, b.low), add(a.high, b.high)}; }
-    static Four multiply(Four a, Four b) {
-        return {multiply(a.low, b.low), multiply(a.high, b.high)};
-    }
-    static Four multiplyAdd(Four a, Four b, Four c) {
-        return {multiplyAdd(a.low, b.low, c.low), multiplyAdd(a.high, b.high, c.high)};
-    }
+    static Vector fromSingles(const float* p) { return _mm_cvtps_pd(loadHalf(p)); }
+    static void toSingles(float* p, Vector a) { storeHalf(p, _mm_cvtpd_ps(a)); }
+    static Vector rounded(Vector a) { return _mm_cvtps_pd(_mm_cvtpd_ps(a)); }
 };
 
 #if defined(__AVX2__)
@@ -121,35 +103,49 @@ struct Stereo2 {
     }
 };
 
-struct AheadFour {
-    using Pair = __m128d;
-    using Four = __m256d;
+struct AheadLanes4 {
+    using Vector = __m256d;
     static constexpr bool looksAhead = true;
+    static constexpr int lanes = 4;
+    static constexpr int ahead = 8;
 
-    static Pair loadPair(const double* p) { return _mm_loadu_pd(p); }
-    static void storePair(double* p, Pair a) { _mm_storeu_pd(p, a); }
-    static Pair multiply(Pair a, Pair b) { return _mm_mul_pd(a, b); }
-    static Pair add(Pair a, Pair b) { return _mm_add_pd(a, b); }
-    static Pair multiplyAdd(Pair a, Pair b, Pair c) { return _mm_fmadd_pd(a, b, c); }
-    static Pair swapped(Pair a) { return _mm_permute_pd(a, 1); }
-
-    static Four loadFour(const double* p) { return _mm256_load_pd(p); }
-    static Four singles(const float* p) { return _mm256_cvtps_pd(_mm_loadu_ps(p)); }
-    static void storeSingles(float* p, Four a) { _mm_storeu_ps(p, _mm256_cvtpd_ps(a)); }
-    static Four rounded(Four a) { return _mm256_cvtps_pd(_mm256_cvtpd_ps(a)); }
-    static Pair low(Four a) { return _mm256_castpd256_pd128(a); }
-    static Four lowTwice(Four a) { return _mm256_permute2f128_pd(a, a, 0x00); }
-    static Four highTwice(Four a) { return _mm256_permute2f128_pd(a, a, 0x11); }
-    static Four twice(Pair a) { return _mm256_insertf128_pd(_mm256_castpd128_pd256(a), a, 1); }
-    static Four swapped(Four a) { return _mm256_permute_pd(a, 0x5); }
-    static Four add(Four a, Four b) { return _mm256_add_pd(a, b); }
-    static Four multiply(Four a, Four b) { return _mm256_mul_pd(a, b); }
-    static Four multiplyAdd(Four a, Four b, Four c) { return _mm256_fmadd_pd(a, b, c); }
+    static Vector load(const double* p) { return _mm256_loadu_pd(p); }
+    static void store(double* p, Vector a) { _mm256_storeu_pd(p, a); }
+    static Vector add(Vector a, Vector b) { return _mm256_add_pd(a, b); }
+    static Vector multiply(Vector a, Vector b) { return _mm256_mul_pd(a, b); }
+    static Vector multiplyAdd(Vector a, Vector b, Vector c) { return _mm256_fmadd_pd(a, b, c); }
+    template <int Lane>
+    static Vector lane(Vector a) {
+        return _mm256_permute4x64_pd(a, Lane * 0x55);
+    }
+    static Vector fromSingles(const float* p) { return _mm256_cvtps_pd(_mm_loadu_ps(p)); }
+    static void toSingles(float* p, Vector a) { _mm_storeu_ps(p, _mm256_cvtpd_ps(a)); }
+    static Vector rounded(Vector a) { return _mm256_cvtps_pd(_mm256_cvtpd_ps(a)); }
 };
 
 #endif
 
 #if defined(__AVX512F__)
+
+struct AheadLanes8 {
+    using Vector = __m512d;
+    static constexpr bool looksAhead = true;
+    static constexpr int lanes = 8;
+    static constexpr int ahead = 8;
+
+    static Vector load(const double* p) { return _mm512_loadu_pd(p); }
+    static void store(double* p, Vector a) { _mm512_storeu_pd(p, a); }
+    static Vector add(Vector a, Vector b) { return _mm512_add_pd(a, b); }
+    static Vector multiply(Vector a, Vector b) { return _mm512_mul_pd(a, b); }
+    static Vector multiplyAdd(Vector a, Vector b, Vector c) { return _mm512_fmadd_pd(a, b, c); }
+    template <int Lane>
+    static Vector lane(Vector a) {
+        return _mm512_permutexvar_pd(_mm512_set1_epi64(Lane), a);
+    }
+    static Vector fromSingles(const float* p) { return _mm512_cvtps_pd(_mm256_loadu_ps(p)); }
+    static void toSingles(float* p, Vector a) { _mm256_storeu_ps(p, _mm512_cvtpd_ps(a)); }
+    static Vector rounded(Vector a) { return _mm512_cvtps_pd(_mm512_cvtpd_ps(a)); }
+};
 
 struct Stereo4 {
     using Vector = __m512d;

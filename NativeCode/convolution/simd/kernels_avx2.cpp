@@ -13,7 +13,7 @@ namespace tessaly {
 namespace {
 
 constexpr Kernels table =
-    kernelsOver<Lanes8, Lanes4, LanesScalar>("avx2", signalKernelsOf<Lanes8, Stereo2, AheadFour>);
+    kernelsOver<Lanes8, Lanes4, LanesScalar>("avx2", signalKernelsOf<Lanes8, Stereo2, AheadLanes4>);
 
 }  // namespace
 

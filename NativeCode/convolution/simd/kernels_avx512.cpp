@@ -13,7 +13,7 @@ namespace tessaly {
 namespace {
 
 constexpr Kernels table = kernelsOver<Lanes16, Lanes8, Lanes4, LanesScalar>(
-    "avx512", signalKernelsOf<Lanes16, Stereo4, AheadFour>);
+    "avx512", signalKernelsOf<Lanes16, Stereo4, AheadLanes8>);
 
 }  // namespace
 

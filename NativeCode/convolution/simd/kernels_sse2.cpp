@@ -13,7 +13,7 @@ namespace tessaly {
 namespace {
 
 constexpr Kernels table =
-    kernelsOver<Lanes4, LanesScalar>("sse2", signalKernelsOf<Lanes4, Stereo1, AheadTwo>);
+    kernelsOver<Lanes4, LanesScalar>("sse2", signalKernelsOf<Lanes4, Stereo1, AheadLanes2>);
 
 }  // namespace
 

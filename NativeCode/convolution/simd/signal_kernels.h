@@ -34,9 +34,9 @@ struct SignalKernels {
     /// written out, in every table: the filters run side by side.
     void (*filterPairs)(std::size_t frames, std::size_t count, const PairFilter* filters);
     /// `count` samples in place through 0 to 4 sections in series, rounded to single behind each.
-    /// The vector tables look four samples ahead: a section's output and state differ from the
+    /// The vector tables look some samples ahead: a section's output and state differ from the
     /// recursion written out by double rounding, so that a sample may round to the next single.
-    /// One that is not finite may spoil the three samples before it.
+    /// One that is not finite may spoil the seven samples before it.
     void (*filterSeries)(std::size_t count,
                          float* samples,
                          std::size_t sections,

@@ -5,9 +5,9 @@
 //   Vector, pieces (stereo pairs in a vector), load, zero, add, subtract, multiply,
 //   loadPair / storePair (a pair of singles of each piece), loadTwoPairs / storeTwoPairs,
 // and one for look-ahead, if looksAhead,
-//   Pair (2 doubles), Four (4 doubles), loadPair, storePair, loadFour, singles (4 floats, widened),
-//   storeSingles, rounded (to single and back), low, lowTwice, highTwice, twice, swapped (within
-//   each pair), add, multiply, multiplyAdd(a, b, c) = a b + c.
+//   Vector (of `lanes` doubles), ahead (samples, a multiple of them), load, store, add, multiply,
+//   multiplyAdd(a, b, c) = a b + c, lane<i> (in all lanes), fromSingles, toSingles, rounded (to
+//   single and back).
 #pragma once
 
 #include "convolution/simd/complex_lanes.h"
@@ -131,18 +131,6 @@ TESSALY_KERNEL_INLINE void filterSeriesPlain(std::size_t count,
     }
 }
 
-/// Four samples ahead: outputs and the next state as products of matrices with the four inputs and
-/// the state. A 2 by 2 block M times (p, q) is the diagonal (M00, M11) times (p, q) and the other
-/// diagonal (M01, M10) times (q, p); two blocks, one above the other, take the same pair twice.
-struct LookAhead {
-    alignas(32) double outputFromLow[2][4];
-    alignas(32) double outputFromHigh[2][4];
-    alignas(32) double outputFromState[2][4];
-    alignas(16) double stateFromLow[2][2];
-    alignas(16) double stateFromHigh[2][2];
-    alignas(16) double stateFromState[2][2];
-};
-
 /// State (z1, z2).
 struct SectionState {
     double first;
@@ -154,135 +142,207 @@ inline SectionState freeStep(const SectionCoefficients& c, SectionState z) {
     return {z.second - c.a1 * z.first, -(c.a2 * z.first)};
 }
 
-inline LookAhead lookAheadOf(const SectionCoefficients& c) {
-    // What an input of 1 leaves in the state, 0 to 3 samples later; each output is b0 times the
-    // input and the first value of the state.
-    SectionState input[4];
-    SectionState first[5];   // of the state (1, 0)
-    SectionState second[5];  // of the state (0, 1)
-    input[0] = {c.b1 - c.a1 * c.b0, c.b2 - c.a2 * c.b0};
-    first[0] = {1.0, 0.0};
-    second[0] = {0.0, 1.0};
-    for (int n = 1; n < 4; ++n) {
-        input[n] = freeStep(c, input[n - 1]);
-    }
-    for (int n = 1; n < 5; ++n) {
-        first[n] = freeStep(c, first[n - 1]);
-        second[n] = freeStep(c, second[n - 1]);
-    }
-    const double h0 = c.b0;
-    const double h1 = input[0].first;
-    const double h2 = input[1].first;
-    const double h3 = input[2].first;
-    return {
-        .outputFromLow = {{h0, h0, h2, h2}, {0.0, h1, h1, h3}},
-        .outputFromHigh = {{0.0, 0.0, h0, h0}, {0.0, 0.0, 0.0, h1}},
-        .outputFromState = {{first[0].first, second[1].first, first[2].first, second[3].first},
-                            {second[0].first, first[1].first, second[2].first, first[3].first}},
-        .stateFromLow = {{input[3].first, input[2].second}, {input[2].first, input[3].second}},
-        .stateFromHigh = {{input[1].first, input[0].second}, {input[0].first, input[1].second}},
-        .stateFromState = {{first[4].first, second[4].second}, {second[4].first, first[4].second}},
-    };
-}
+template <int...>
+struct SectionNumbers {};
 
+/// Some samples ahead of a section: their outputs are sums over their inputs and what the last two
+/// inputs and outputs before them leave behind. Only the latter waits for a result, once in so many
+/// samples.
+template <int Ahead>
+struct LookAhead {
+    /// The outputs from an input of 1, h[0] to h[Ahead - 1], behind zeros: from input i those that
+    /// begin i places earlier.
+    double fromInputs[2 * Ahead];
+    double fromLastInput[Ahead];
+    double fromInputBefore[Ahead];
+    double fromLastOutput[Ahead];
+    double fromOutputBefore[Ahead];
+    /// What the state that a block begins with adds.
+    double fromState[Ahead];
+
+    explicit LookAhead(const RunningSection& section) {
+        const SectionCoefficients& c = section.coefficients;
+        SectionState first = {1.0, 0.0};   // what remains of z1 = 1
+        SectionState second = {0.0, 1.0};  // and of z2 = 1
+        double last = c.b0;
+        for (int n = 0; n < Ahead; ++n) {
+            const double p = first.first;
+            const double q = second.first;
+            fromInputs[n] = 0.0;
+            fromInputs[Ahead + n] = last;
+            fromLastInput[n] = c.b1 * p + c.b2 * q;
+            fromInputBefore[n] = c.b2 * p;
+            fromLastOutput[n] = -(c.a1 * p + c.a2 * q);
+            fromOutputBefore[n] = -(c.a2 * p);
+            fromState[n] = section.z1 * p + section.z2 * q;
+            // The output of the next sample from this input: by its state, b - a b0.
+            last = (c.b1 - c.a1 * c.b0) * p + (c.b2 - c.a2 * c.b0) * q;
+            first = freeStep(c, first);
+            second = freeStep(c, second);
+        }
+    }
+};
+
+/// One section of several in series, `Ahead` samples at a time.
 template <class Lanes>
-TESSALY_KERNEL_INLINE typename Lanes::Four stepLookAhead(typename Lanes::Four x,
-                                                         const LookAhead& matrices,
-                                                         typename Lanes::Pair& state) {
-    using Four = typename Lanes::Four;
-    using Pair = typename Lanes::Pair;
-    const auto four = [](const double* p) { return Lanes::loadFour(p); };
-    const auto pair = [](const double* p) { return Lanes::loadPair(p); };
-    const Four low = Lanes::lowTwice(x);
-    const Four high = Lanes::highTwice(x);
-    const Four lowSwapped = Lanes::swapped(low);
-    const Four highSwapped = Lanes::swapped(high);
-    const Four z = Lanes::twice(state);
-    const Pair stateSwapped = Lanes::swapped(state);
+class AheadSection {
+public:
+    using Vector = typename Lanes::Vector;
+    static constexpr int ahead = Lanes::ahead;
+    static constexpr int lanes = Lanes::lanes;
+    static constexpr int vectors = ahead / lanes;
 
-    // Short chains: what waits for a result blocks what could run beside it.
-    const Four fromLow = Lanes::multiplyAdd(lowSwapped, four(matrices.outputFromLow[1]),
-                                            Lanes::multiply(low, four(matrices.outputFromLow[0])));
-    const Four fromHigh =
-        Lanes::multiplyAdd(highSwapped, four(matrices.outputFromHigh[1]),
-                           Lanes::multiply(high, four(matrices.outputFromHigh[0])));
-    const Four fromState =
-        Lanes::multiplyAdd(Lanes::swapped(z), four(matrices.outputFromState[1]),
-                           Lanes::multiply(z, four(matrices.outputFromState[0])));
-    const Four y = Lanes::add(Lanes::add(fromLow, fromHigh), fromState);
-
-    const Pair nextFromLow =
-        Lanes::multiplyAdd(Lanes::low(lowSwapped), pair(matrices.stateFromLow[1]),
-                           Lanes::multiply(Lanes::low(low), pair(matrices.stateFromLow[0])));
-    const Pair nextFromHigh =
-        Lanes::multiplyAdd(Lanes::low(highSwapped), pair(matrices.stateFromHigh[1]),
-                           Lanes::multiply(Lanes::low(high), pair(matrices.stateFromHigh[0])));
-    const Pair next = Lanes::multiplyAdd(state, pair(matrices.stateFromState[0]),
-                                         Lanes::add(nextFromLow, nextFromHigh));
-    state = Lanes::multiplyAdd(stateSwapped, pair(matrices.stateFromState[1]), next);
-    return y;
-}
-
-template <class Lanes, int Sections>
-void filterSeriesAhead(std::size_t count, float* samples, RunningSection* series) {
-    LookAhead matrices[Sections];
-    typename Lanes::Pair state[Sections];
-    for (int s = 0; s < Sections; ++s) {
-        matrices[s] = lookAheadOf(series[s].coefficients);
-        const double z[2] = {series[s].z1, series[s].z2};
-        state[s] = Lanes::loadPair(z);
-    }
-    // Each section works one group of four behind the one before it, so that none waits for
-    // another.
-    typename Lanes::Four waiting[Sections];
-    const auto advance = [&](std::size_t group, int s) {
-        const auto section = static_cast<std::size_t>(s);
-        const typename Lanes::Four y =
-            stepLookAhead<Lanes>(s == 0 ? Lanes::singles(samples + 4 * group) : waiting[section],
-                                 matrices[section], state[section]);
-        if (s + 1 < Sections) {
-            waiting[section + 1] = Lanes::rounded(y);
-        } else {
-            Lanes::storeSingles(samples + 4 * (group - section), y);
-        }
-    };
-    const std::size_t groups = count / 4;
-    for (std::size_t group = 0; group + 1 < Sections; ++group) {
-        for (int s = static_cast<int>(group); s >= 0; --s) {
-            advance(group, s);
-        }
-    }
-    for (std::size_t group = Sections - 1; group < groups; ++group) {
+    TESSALY_KERNEL_INLINE explicit AheadSection(const RunningSection& section) : from_(section) {
         TESSALY_KERNEL_UNROLL
-        for (int s = Sections - 1; s >= 0; --s) {
-            advance(group, s);
+        for (int v = 0; v < vectors; ++v) {
+            carry_[v] = Lanes::load(from_.fromState + v * lanes);
         }
     }
-    for (std::size_t group = groups; group < groups + Sections - 1; ++group) {
-        for (int s = Sections - 1; s > static_cast<int>(group - groups); --s) {
-            advance(group, s);
+
+    /// Outputs of as many inputs.
+    TESSALY_KERNEL_INLINE void step(const Vector (&x)[vectors], Vector (&y)[vectors]) {
+        addInputs<0>(x, y);
+        TESSALY_KERNEL_UNROLL
+        for (int v = 0; v < vectors; ++v) {
+            y[v] = Lanes::add(y[v], carry_[v]);  // last of all, since this one waits
+        }
+        lastOutput_ = Lanes::template lane<lanes - 1>(y[vectors - 1]);
+        outputBefore_ = Lanes::template lane<lanes - 2>(y[vectors - 1]);
+        TESSALY_KERNEL_UNROLL
+        for (int v = 0; v < vectors; ++v) {
+            const Vector fromInputs = Lanes::multiplyAdd(
+                Lanes::load(from_.fromLastInput + v * lanes), lastInput_,
+                Lanes::multiply(Lanes::load(from_.fromInputBefore + v * lanes), inputBefore_));
+            carry_[v] = Lanes::multiplyAdd(
+                Lanes::load(from_.fromLastOutput + v * lanes), lastOutput_,
+                Lanes::multiplyAdd(Lanes::load(from_.fromOutputBefore + v * lanes), outputBefore_,
+                                   fromInputs));
         }
     }
-    const std::size_t i = 4 * groups;
-    for (int s = 0; s < Sections; ++s) {
-        double z[2];
-        Lanes::storePair(z, state[s]);
-        series[s].z1 = z[0];
-        series[s].z2 = z[1];
+
+    /// The state behind the last step.
+    void storeState(RunningSection& section) const {
+        const auto first = [](const Vector& a) {
+            double values[lanes];
+            Lanes::store(values, a);
+            return values[0];
+        };
+        const SectionCoefficients& c = section.coefficients;
+        const double z2Before = c.b2 * first(inputBefore_) - c.a2 * first(outputBefore_);
+        section.z1 = c.b1 * first(lastInput_) + z2Before - c.a1 * first(lastOutput_);
+        section.z2 = c.b2 * first(lastInput_) - c.a2 * first(lastOutput_);
     }
-    filterSeriesPlain<Sections>(count - i, samples + i, series);
+
+private:
+    /// Inputs `First` and the one behind it, in sums of their own, and all that follow.
+    template <int First>
+    TESSALY_KERNEL_INLINE void addInputs(const Vector (&x)[vectors], Vector (&sum)[vectors]) {
+        const Vector even = Lanes::template lane<First % lanes>(x[First / lanes]);
+        const Vector odd = Lanes::template lane<First % lanes + 1>(x[First / lanes]);
+        Vector part[vectors];
+        TESSALY_KERNEL_UNROLL
+        for (int v = First / lanes; v < vectors; ++v) {
+            const double* const outputs = from_.fromInputs + ahead + v * lanes - First;
+            part[v] = Lanes::multiply(Lanes::load(outputs), even);
+            part[v] = Lanes::multiplyAdd(Lanes::load(outputs - 1), odd, part[v]);
+        }
+        if constexpr (First + 2 < ahead) {
+            addInputs<First + 2>(x, sum);
+        } else {
+            lastInput_ = odd;
+            inputBefore_ = even;
+        }
+        TESSALY_KERNEL_UNROLL
+        for (int v = First / lanes; v < vectors; ++v) {
+            const bool isFirst = v < (First + 2) / lanes || First + 2 >= ahead;
+            sum[v] = isFirst ? part[v] : Lanes::add(sum[v], part[v]);
+        }
+    }
+
+    LookAhead<ahead> from_;
+    Vector carry_[vectors];
+    // In all lanes.
+    Vector lastInput_;
+    Vector inputBefore_;
+    Vector lastOutput_;
+    Vector outputBefore_;
+};
+
+/// Section `Number` takes the step that it is at when the first one is at `step`: each works one
+/// behind the one before it, so that none waits for another.
+/// @param waiting  what the section before each one left
+template <int Number, class Lanes, int Sections, int Vectors>
+TESSALY_KERNEL_INLINE void advanceSection(AheadSection<Lanes> (&running)[Sections],
+                                          typename Lanes::Vector (&waiting)[Sections][Vectors],
+                                          float* samples,
+                                          std::size_t step) {
+    constexpr int lanes = Lanes::lanes;
+    float* const at = samples + Lanes::ahead * (step - Number);
+    if constexpr (Number == 0) {
+        TESSALY_KERNEL_UNROLL
+        for (int v = 0; v < Vectors; ++v) {
+            waiting[0][v] = Lanes::fromSingles(at + v * lanes);
+        }
+    }
+    typename Lanes::Vector y[Vectors];
+    running[Number].step(waiting[Number], y);
+    TESSALY_KERNEL_UNROLL
+    for (int v = 0; v < Vectors; ++v) {
+        if constexpr (Number + 1 < Sections) {
+            waiting[Number + 1][v] = Lanes::rounded(y[v]);
+        } else {
+            Lanes::toSingles(at + v * lanes, y[v]);
+        }
+    }
 }
 
-inline constexpr std::size_t fewestAhead = 16;  // samples that are worth the matrices; 4 groups
+/// @param count  a multiple of Lanes::ahead, and at least as many steps as there are sections
+template <class Lanes, int... Section>
+void filterSeriesAhead(std::size_t count,
+                       float* samples,
+                       RunningSection* series,
+                       SectionNumbers<Section...>) {
+    constexpr int sections = sizeof...(Section);
+    AheadSection<Lanes> running[sections] = {AheadSection<Lanes>(series[Section])...};
+    typename Lanes::Vector waiting[sections][AheadSection<Lanes>::vectors]{};
+    const std::size_t steps = count / Lanes::ahead;
+    const auto begun = [](std::size_t step, int s) { return step >= static_cast<std::size_t>(s); };
+    std::size_t step = 0;
+    // The last section first: each takes what the one before it left in the step before.
+    for (; step + 1 < sections; ++step) {
+        ((begun(step, sections - 1 - Section)
+              ? advanceSection<sections - 1 - Section>(running, waiting, samples, step)
+              : void()),
+         ...);
+    }
+    for (; step < steps; ++step) {
+        (advanceSection<sections - 1 - Section>(running, waiting, samples, step), ...);
+    }
+    for (; step + 1 < steps + sections; ++step) {
+        ((begun(steps + static_cast<std::size_t>(sections - 1 - Section),
+                static_cast<int>(step) + 1)
+              ? advanceSection<sections - 1 - Section>(running, waiting, samples, step)
+              : void()),
+         ...);
+    }
+    (running[Section].storeState(series[Section]), ...);
+}
 
-template <class Lanes, int Sections>
-void filterSeriesOf(std::size_t count, float* samples, RunningSection* series) {
+template <class Lanes, int... Section>
+void filterSeriesOf(std::size_t count,
+                    float* samples,
+                    RunningSection* series,
+                    SectionNumbers<Section...> numbers) {
+    std::size_t done = 0;
     if constexpr (Lanes::looksAhead) {
-        if (count >= fewestAhead) {
-            return filterSeriesAhead<Lanes, Sections>(count, samples, series);
+        // As many steps as there are sections at least, and worth the sums.
+        constexpr std::size_t fewest = 4 * Lanes::ahead;
+        if (count >= fewest) {
+            done = count / Lanes::ahead * Lanes::ahead;
+            filterSeriesAhead<Lanes>(done, samples, series, numbers);
         }
     }
-    filterSeriesPlain<Sections>(count, samples, series);
+    filterSeriesPlain<sizeof...(Section)>(count - done, samples + done, series);
 }
 
 template <class Lanes>
@@ -292,13 +352,13 @@ void filterSeriesLanes(std::size_t count,
                        RunningSection* series) {
     switch (sections) {
         case 1:
-            return filterSeriesOf<Lanes, 1>(count, samples, series);
+            return filterSeriesOf<Lanes>(count, samples, series, SectionNumbers<0>{});
         case 2:
-            return filterSeriesOf<Lanes, 2>(count, samples, series);
+            return filterSeriesOf<Lanes>(count, samples, series, SectionNumbers<0, 1>{});
         case 3:
-            return filterSeriesOf<Lanes, 3>(count, samples, series);
+            return filterSeriesOf<Lanes>(count, samples, series, SectionNumbers<0, 1, 2>{});
         case 4:
-            return filterSeriesOf<Lanes, 4>(count, samples, series);
+            return filterSeriesOf<Lanes>(count, samples, series, SectionNumbers<0, 1, 2, 3>{});
         default:
             return;
     }
