@@ -1,5 +1,6 @@
-// One forward and one backward real transform, of our tables and of other libraries.
-// Names: Transform/<implementation>/<real length>.
+// One forward and one backward real transform, of our tables and of other libraries, and those of
+// the convolver's blocks: a window of as many samples to its spectrum, and back to the half that is
+// heard. Names: Transform/<implementation>/<real length>; blocks_<table> are the latter.
 #include <benchmark/benchmark.h>
 
 #include <string>
@@ -43,6 +44,19 @@ void ours(benchmark::State& state, const Kernels* kernels, std::int32_t length) 
     for (auto _ : state) {
         computeForward(handle, arrays.samples.data(), arrays.bins.data());
         computeBackward(handle, arrays.bins.data(), arrays.result.data());
+        benchmark::ClobberMemory();
+    }
+}
+
+void ofBlocks(benchmark::State& state, const Kernels* kernels, std::int32_t length) {
+    Arrays arrays(length);
+    TransformHandle handle;
+    forceKernels(kernels);
+    createBlockTransform(handle, length);
+    forceKernels(nullptr);
+    for (auto _ : state) {
+        computeWindow(handle, arrays.samples.data(), arrays.bins.data());
+        computeBlock(handle, arrays.bins.data(), arrays.result.data(), length / 2);
         benchmark::ClobberMemory();
     }
 }
@@ -106,6 +120,8 @@ const bool registered = [] {
             const Kernels* const kernels = list.tables[i];
             const std::string name = rowName(std::string("tessaly_") + kernels->name, length);
             benchmark::RegisterBenchmark(name.c_str(), ours, kernels, length);
+            const std::string blocks = rowName(std::string("blocks_") + kernels->name, length);
+            benchmark::RegisterBenchmark(blocks.c_str(), ofBlocks, kernels, length);
         }
 #if defined(TESSALY_BENCH_FFTW)
         benchmark::RegisterBenchmark(rowName("fftw", length).c_str(), fftw, length);
