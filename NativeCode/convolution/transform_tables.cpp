@@ -106,16 +106,17 @@ private:
     TransformTables tables_;
 };
 
-/// Floats of the passes over rings, the last one of radix 2, 4 or 8.
-std::size_t ringFloats(std::int32_t columns) {
+/// Floats of the passes over rings.
+std::size_t ringFloats(std::int32_t columns, std::int32_t lanes) {
     std::size_t floats = 0;
     std::size_t rings = 1;
-    std::int32_t n = columns;
-    for (; n > 8; n /= 4) {
-        floats += 6 * rings;
-        rings *= 4;
+    for (std::int32_t n = columns; n > 1;) {
+        const std::int32_t radix = ringRadix(lanes, n);
+        floats += 2 * static_cast<std::size_t>(radix - 1) * rings;
+        rings *= static_cast<std::size_t>(radix);
+        n /= radix;
     }
-    return floats + 2 * static_cast<std::size_t>(n - 1) * rings;
+    return floats;
 }
 
 /// Floats of the passes across the lanes, four rows at a time.
@@ -131,7 +132,7 @@ std::size_t acrossFloats(std::int32_t points, std::int32_t lanes) {
 class BlockTableStorage {
 public:
     BlockTableStorage(std::int32_t points, std::int32_t lanes)
-        : rings_(ringFloats(points / lanes)), across_(acrossFloats(points, lanes)) {
+        : rings_(ringFloats(points / lanes, lanes)), across_(acrossFloats(points, lanes)) {
         tables_.points = points;
         tables_.lanes = lanes;
         tables_.columns = points / lanes;
@@ -162,11 +163,11 @@ private:
             }
             turns = std::move(split);
         };
-        std::int32_t n = tables_.columns;
-        for (; n > 8; n /= 4) {
-            splitBy(4);
+        for (std::int32_t n = tables_.columns; n > 1;) {
+            const std::int32_t radix = ringRadix(tables_.lanes, n);
+            splitBy(radix);
+            n /= radix;
         }
-        splitBy(n);
 
         fillAcross(turns);
     }

@@ -242,7 +242,8 @@ void FirComposer::writeStart(const EarBuffers& ears, CompositionInputs& inputs, 
     notes.written.include(0, end);
 }
 
-/// Of the start only the frames that pieces have left or come to, in a room of full size.
+/// Only the frames that pieces have left or come to, of the start in a room of full size, or of a
+/// response without a tail.
 void FirComposer::writeStretches(const EarBuffers& ears,
                                  CompositionInputs& inputs,
                                  int end,
@@ -255,8 +256,10 @@ void FirComposer::writeStretches(const EarBuffers& ears,
         const EarBuffers part{ears.left + first, ears.right + first, last - first};
         clearFrames(part, part.size);
         writer_.writeFrames(part, first, wanted_.pieces, inputs.sampleRate, filters);
-        inputs.tail.addStart(part.left, part.right, first, last, wanted_.tailCutOff,
-                             wanted_.tailGain);
+        if (hasTail(inputs)) {
+            inputs.tail.addStart(part.left, part.right, first, last, wanted_.tailCutOff,
+                                 wanted_.tailGain);
+        }
         notes.written.include(first, last);
     }
 }
@@ -327,7 +330,12 @@ void FirComposer::writeChanges(CompositionInputs& inputs) noexcept {
     if (!measuredTail || blended || begin >= ears.size ||
         begin > inputs.tail.startFrames(wanted_.tailCutOff)) {
         const bool sameEnd = !hasTail(inputs) || (sameTail && sameGain && !synthetic);
-        if (endKnown_ || !samePieces || !sameEnd) {
+        // The fade at its end counts frames from the start.
+        const bool plain = startKnown_ && !endKnown_ && !hasTail(inputs) && !blended;
+        if (plain && !samePieces &&
+            differences.hull().end <= inputs.sizes.FIR_size - tailFadeFrames) {
+            writeStretches(ears, inputs, ears.size, differences);
+        } else if (endKnown_ || !samePieces || !sameEnd) {
             writeWhole(ears, inputs, piecesEnd,
                        startKnown_ && !endKnown_ && sameEnd ? differences : everything);
         }

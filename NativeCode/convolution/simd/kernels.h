@@ -26,14 +26,23 @@ struct TransformTables {
     const float* split = nullptr;
 };
 
+/// Radix of the pass that splits rings of so many rows: 2, 4 or 8. Eight at once want the registers
+/// of the widest lanes.
+constexpr std::int32_t ringRadix(std::int32_t lanes, std::int32_t rows) noexcept {
+    if (rows <= 8) {
+        return rows;
+    }
+    return lanes == 16 && rows == 64 ? 8 : 4;
+}
+
 /// Constants of the transform of blocks, likewise: M points as K rows of L lanes.
 struct BlockTables {
     std::int32_t points = 0;   ///< M, a power of two from 2, at least L * L
     std::int32_t lanes = 0;    ///< L: 1, 4, 8 or 16
     std::int32_t columns = 0;  ///< K
-    /// Passes of radix R = 4, and of 2, 4 or 8 at the end, split rings of polynomials in u with
-    /// u^n = c into R each: for each pass and ring r, r^2 .. r^(R - 1), each as real, imaginary,
-    /// where r^R = c. The first ring has u^M = i.
+    /// Passes of radix R split rings of polynomials in u with u^n = c into R each: for each pass
+    /// and ring r, r^2 .. r^(R - 1), each as real, imaginary, where r^R = c. The first ring has u^M
+    /// = i.
     const float* rings = nullptr;
     /// For four rows at a time: the powers of the rows' roots that the passes across their lanes
     /// take, each as L real parts and then L imaginary parts. Null with one lane.

@@ -98,37 +98,52 @@ TESSALY_KERNEL_INLINE void splitRings(
     }
 }
 
-/// Passes take four rings at once; the one on the shortest rings two, four or eight.
 template <class Lanes, class Source>
-TESSALY_KERNEL_INLINE void splitShortest(
-    const Source& source, float* rows, Index n, Index rings, const float* roots) {
-    if (n == 8) {
+TESSALY_KERNEL_INLINE void splitBy(
+    Index radix, const Source& source, float* rows, Index n, Index rings, const float* roots) {
+    if (radix == 8) {
         splitRings<Lanes, 8>(source, rows, n, rings, roots);
-    } else if (n == 4) {
+    } else if (radix == 4) {
         splitRings<Lanes, 4>(source, rows, n, rings, roots);
     } else {
         splitRings<Lanes, 2>(source, rows, n, rings, roots);
     }
 }
 
+/// The passes down the rows: rings of n rows each, `count` of them, by radix R and with their
+/// roots.
+struct RingPasses {
+    struct Pass {
+        Index radix;
+        Index n;
+        Index rings;
+        const float* roots;
+    };
+    Pass passes[16];
+    int count = 0;
+
+    explicit RingPasses(const BlockTables& tables) {
+        Index rings = 1;
+        const float* roots = tables.rings;
+        for (Index n = tables.columns; n > 1;) {
+            const Index radix = ringRadix(tables.lanes, static_cast<std::int32_t>(n));
+            passes[count++] = {radix, n, rings, roots};
+            roots += 2 * (radix - 1) * rings;
+            rings *= radix;
+            n /= radix;
+        }
+    }
+};
+
 template <class Lanes, class Source>
 void splitAll(const BlockTables& tables, const Source& source, float* rows) {
-    const float* roots = tables.rings;
-    Index n = tables.columns;
-    if (n <= 8) {
-        splitShortest<Lanes>(source, rows, n, 1, roots);
-        return;
+    const RingPasses all(tables);
+    const RingPasses::Pass& first = all.passes[0];
+    splitBy<Lanes>(first.radix, source, rows, first.n, first.rings, first.roots);
+    for (int k = 1; k < all.count; ++k) {
+        const RingPasses::Pass& pass = all.passes[k];
+        splitBy<Lanes>(pass.radix, RowSource<Lanes>{rows}, rows, pass.n, pass.rings, pass.roots);
     }
-    splitRings<Lanes, 4>(source, rows, n, 1, roots);
-    roots += 6;
-    Index rings = 4;
-    n /= 4;
-    for (; n > 8; n /= 4) {
-        splitRings<Lanes, 4>(RowSource<Lanes>{rows}, rows, n, rings, roots);
-        roots += 6 * rings;
-        rings *= 4;
-    }
-    splitShortest<Lanes>(RowSource<Lanes>{rows}, rows, n, rings, roots);
 }
 
 /// The passes across the lanes work on four rows at a time, which is what the registers hold
@@ -328,14 +343,16 @@ TESSALY_KERNEL_INLINE void joinRings(
 }
 
 template <class Lanes, class Sink>
-TESSALY_KERNEL_INLINE void joinShortest(
-    const float* rows, const Sink& sink, Index n, Index rings, Index wanted, const float* roots) {
-    if (n == 8) {
-        joinRings<Lanes, 8>(rows, sink, n, rings, wanted, roots);
-    } else if (n == 4) {
-        joinRings<Lanes, 4>(rows, sink, n, rings, wanted, roots);
+TESSALY_KERNEL_INLINE void joinBy(const RingPasses::Pass& pass,
+                                  const float* rows,
+                                  const Sink& sink,
+                                  Index wanted) {
+    if (pass.radix == 8) {
+        joinRings<Lanes, 8>(rows, sink, pass.n, pass.rings, wanted, pass.roots);
+    } else if (pass.radix == 4) {
+        joinRings<Lanes, 4>(rows, sink, pass.n, pass.rings, wanted, pass.roots);
     } else {
-        joinRings<Lanes, 2>(rows, sink, n, rings, wanted, roots);
+        joinRings<Lanes, 2>(rows, sink, pass.n, pass.rings, wanted, pass.roots);
     }
 }
 
@@ -343,31 +360,11 @@ TESSALY_KERNEL_INLINE void joinShortest(
 /// least.
 template <class Lanes>
 void joinAll(const BlockTables& tables, float* rows, float* samples, Index wanted) {
-    const BlockSink<Lanes> result{samples};
-    const RowSink<Lanes> between{rows};
-    Index n = tables.columns;
-    Index rings = 1;
-    const float* roots = tables.rings;
-    while (n > 8) {
-        roots += 6 * rings;
-        rings *= 4;
-        n /= 4;
+    const RingPasses all(tables);
+    for (int k = all.count - 1; k > 0; --k) {
+        joinBy<Lanes>(all.passes[k], rows, RowSink<Lanes>{rows}, wanted);
     }
-    if (rings == 1) {
-        joinShortest<Lanes>(rows, result, n, rings, wanted, roots);
-        return;
-    }
-    joinShortest<Lanes>(rows, between, n, rings, wanted, roots);
-    for (;;) {
-        n *= 4;
-        rings /= 4;
-        roots -= 6 * rings;
-        if (rings == 1) {
-            joinRings<Lanes, 4>(rows, result, n, rings, wanted, roots);
-            return;
-        }
-        joinRings<Lanes, 4>(rows, between, n, rings, wanted, roots);
-    }
+    joinBy<Lanes>(all.passes[0], rows, BlockSink<Lanes>{samples}, wanted);
 }
 
 template <class Lanes>
