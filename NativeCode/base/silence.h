@@ -43,25 +43,6 @@ std::uint64_t anyBits(const float* samples) noexcept TESSALY_NONBLOCKING {
 
 }  // namespace detail
 
-/// True if every value is a zero without sign. A block of sound is left at its first value that is
-/// none, so the question costs next to nothing there. Block time.
-/// @param samples  `count` floats; may be null for a count of 0
-inline bool isSilent(const float* samples, std::size_t count) noexcept TESSALY_NONBLOCKING {
-    constexpr std::size_t group = 64;
-    std::size_t i = 0;
-    for (; i + group <= count; i += group) {
-        if (detail::anyBits<group>(samples + i) != 0) {
-            return false;
-        }
-    }
-    for (; i < count; ++i) {
-        if (std::bit_cast<std::uint32_t>(samples[i]) != 0) {
-            return false;
-        }
-    }
-    return true;
-}
-
 /// All samples are zero, of either sign. Stops soon after the first that is not. Block time.
 inline bool allZero(const float* samples, std::size_t count) noexcept TESSALY_NONBLOCKING {
     constexpr std::size_t group = 64;

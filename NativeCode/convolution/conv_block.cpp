@@ -309,7 +309,7 @@ void convClass::processCrossfade(convClass& second, std::int32_t heardOfOld) noe
         findChangedPartitions();
         scaled_ = scaledNow();
     }
-    advanceFarTail(silent);
+    advanceFarTail(silent, changedCount_ == 0);
     const RingView ring = second.ownRing();
     const std::int32_t heard = std::clamp(heardOfOld, 0, blockLength);
     if (changedCount_ > 0 && ring.state->silent()) {

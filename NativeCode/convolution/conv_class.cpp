@@ -251,19 +251,41 @@ void convClass::followCompensation() noexcept {
     if (naturalOrder_ || !hpTFactive || FDLtoBUFConv != 1) {
         return;
     }
+    if (isSecondInstance == 0) {
+        reorderResponse();
+    }
     useNaturalOrder();
-    if (isSecondInstance != 0) {
+}
+
+/// The responses may have been written since they were taken, so their samples come from the
+/// spectra: delayed by a block they stand in the half that a block spectrum gives back.
+void convClass::reorderResponse() noexcept {
+    const bool complete = end_.complete() && accumL != nullptr && filterPartsL[0] != nullptr &&
+                          filterPartsR[0] != nullptr && sums_.ready() && !padded_.empty();
+    if (!complete || silent_[0] != 0) {
         return;
     }
-    const auto take = [this](const float* kept, const float* fir, ComplexBin* spectrum) noexcept {
-        const float* const samples = kept != nullptr ? kept : fir;
-        if (samples != nullptr && spectrum != nullptr && firBufferSize >= blockLength &&
-            silent_[0] == 0) {
-            dftiStatus = transformPartition(samples, spectrum);
+    float* const samples = padded_.data();
+    padded_.clear();
+    samples[blockLength] = 1.0f;
+    dftiStatus = windowFFT(samples, accumL, fftHandle);
+    if (dftiStatus != transformOk) {
+        return;
+    }
+    sums_.begin();
+    sums_.add(accumL, filterPartsL[0], filterPartsR[0]);
+    sums_.store(end_);
+    padded_.clear();
+    const float scale = 1.0f / static_cast<float>(fftLength);
+    const auto reorder = [&](const ComplexBin* delayed, ComplexBin* spectrum) noexcept {
+        dftiStatus = blockIFFT(delayed, samples, blockLength, ifftHandle);
+        for (std::int32_t i = 0; i < blockLength; ++i) {
+            samples[i] *= scale;
         }
+        dftiStatus = FFT(samples, spectrum, fftHandle);
     };
-    take(timePartsL[0], firL, filterPartsL[0]);
-    take(timePartsR[0], firR, filterPartsR[0]);
+    reorder(end_.left, filterPartsL[0]);
+    reorder(end_.right, filterPartsR[0]);
 }
 
 void convClass::clearFDL() noexcept {

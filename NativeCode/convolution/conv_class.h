@@ -41,7 +41,8 @@ void resetConvolutionState() noexcept;
 /// Spectra are block spectra: B bins in the kernels' own order, enough for the half of a result
 /// that is heard (spectral_primitives.h). Where the other half matters, with `directFilterFeed` and
 /// with headphone compensation of one partition, they are B+1 bins in natural order. There is room
-/// for these in each.
+/// for these in each. Where compensation comes and goes, crossfade blocks have to go through
+/// `processCrossfade`, in which the second instance takes the kind of spectra over.
 ///
 /// With a second instance the engine lets it borrow `filterPartsL`, `filterPartsR`,
 /// `hpTFspectrumL` and `hpTFspectrumR` of the first one, entry by entry; it neither writes nor
@@ -239,7 +240,7 @@ private:
     EarSpectra accumulators() const noexcept { return {accumL, accumR}; }
     bool takeInput(std::uint64_t block) noexcept;
     std::uint64_t blockNumber() const noexcept;
-    void advanceFarTail(bool silent) noexcept;
+    void advanceFarTail(bool silent, bool taken = true) noexcept;
     bool canSum(const RingView& ring, bool compensated) const noexcept;
     void render(const RingView& ring, const RingView& other) noexcept;
     void renderSilence() noexcept;
@@ -249,6 +250,7 @@ private:
     std::size_t bins() const noexcept;
     void useNaturalOrder() noexcept;
     void followCompensation() noexcept;
+    void reorderResponse() noexcept;
     std::int32_t transformWindow(const float* samples, ComplexBin* spectrum) noexcept;
     std::int32_t transformPartition(const float* samples, ComplexBin* spectrum) noexcept;
     void transformBack(std::int32_t samples) noexcept;

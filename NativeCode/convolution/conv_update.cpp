@@ -140,11 +140,16 @@ void convClass::transformChanged() noexcept {
 
 /// The far tail is built from what the spectra were made of: a copy where there is one of all
 /// samples, the response itself where its writer tells of each change.
-void convClass::advanceFarTail(bool silent) noexcept {
+/// @param taken  the copies are those of the present responses
+void convClass::advanceFarTail(bool silent, bool taken) noexcept {
     if (far_ == nullptr) {
         return;
     }
     const bool copied = !timePartsL.empty() && timePartsL.back() != nullptr;
+    if (copied && !taken) {
+        far_->advance(input, silent, standsBeforeFar(scaled_), nullptr, nullptr);
+        return;
+    }
     const float* const left = copied ? timeMemoryL_.data() : firL;
     const float* const right = copied ? timeMemoryR_.data() : firR;
     const auto near = static_cast<std::int32_t>(far_->firstPartition()) * blockLength;

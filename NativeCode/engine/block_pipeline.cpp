@@ -87,13 +87,16 @@ bool isCrossfadeBlock(const EngineState& state) noexcept {
 }
 
 /// Neither this block's window nor the ring it is convolved with holds a sound, and has not for a
-/// while: waking from a response that was put off costs more than a usual block.
+/// while: waking from a response that was put off costs more than a usual block. With headphone
+/// compensation nothing is put off, and what was is written before a selection changes: from then
+/// on it counts which responses came before the change.
 bool watchSilence(EngineState& state) noexcept {
     const convClass& heard = isCrossfadeBlock(state) ? *state.secondOLS : *state.firstOLS;
     const bool silent =
         state.frontEnd.seesSilence(state.inBlock, state.inputChannel, state.controls.bassBoost,
                                    state.switches.doppler) &&
-        heard.pastSilent() && essError == essErrorNone;
+        heard.pastSilent() && essError == essErrorNone && !hpTFactive &&
+        state.firstOLS->hpTFselectSeen == qvHpTFcompSelect;
     state.silentBlocks = silent ? std::min(state.silentBlocks + 1, silencePatience + 1) : 0;
     return state.silentBlocks > silencePatience;
 }
@@ -199,10 +202,12 @@ bool readsTheSame(const EngineState& state, const BlockInputs& inputs) noexcept 
            *state.mixParameters == inputs.mix && state.controls == inputs.controls;
 }
 
-/// Of the engine's own switches: nothing in it counts blocks or looks a window up on its own.
+/// A block in full with the same inputs leaves these engines as they were: no delay line moves on,
+/// no step is limited or counted towards the next direction, and no block is left out.
 bool mayRest(const EngineState& state) noexcept {
     return !state.switches.doppler && !state.switches.interpolateAngles &&
-           state.switches.qvUpdateInterval <= 1 && state.settings.debugDump == 0;
+           !state.switches.qvSmoothSteps && state.switches.qvUpdateInterval <= 1 &&
+           state.settings.debugDump == 0;
 }
 
 /// Flags of the process that ask for something.
@@ -225,6 +230,7 @@ void noteRest(EngineState& state, bool crossfade) noexcept {
 
 /// As a block in full would leave it.
 void restForABlock(EngineState& state) noexcept {
+    state.rest.blockLeft();
     advanceRings(state);
     state.firstOLS->rest(state.rest.crossfade() ? state.secondOLS.get() : nullptr);
     std::fill_n(state.outBlock, std::size_t{2} * static_cast<std::size_t>(state.sizes.blocklenght),

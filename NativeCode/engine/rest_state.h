@@ -25,8 +25,9 @@ struct BlockInputs {
     bool operator==(const BlockInputs&) const = default;
 };
 
-/// Two silent blocks in a row that were made from the same, in full, leave the engine as it was but
-/// for counters: what follows need not be made until something changes.
+/// Two silent blocks in a row that were made from the same, in full, leave an engine that takes no
+/// steps of its own as it was, but for counters: what follows need not be made until something
+/// changes.
 class RestState {
 public:
     /// After a block in full. Block time.
@@ -48,11 +49,17 @@ public:
     bool crossfade() const noexcept { return crossfade_; }
     void forget() noexcept { settled_ = lastWasQuiet_ = false; }
 
+    /// A block was not made. Block time.
+    void blockLeft() noexcept { ++blocksLeft_; }
+    /// Blocks that were not made since the engine was built.
+    std::uint64_t blocksLeft() const noexcept { return blocksLeft_; }
+
 private:
     BlockInputs inputs_;
     bool settled_ = false;
     bool lastWasQuiet_ = false;
     bool crossfade_ = false;
+    std::uint64_t blocksLeft_ = 0;
 };
 
 }  // namespace tessaly

@@ -8,7 +8,6 @@
 #include "base/log.h"
 #include "base/numeric_conversion.h"
 #include "base/precision.h"
-#include "base/silence.h"
 #include "handler/block_copy.h"
 #include "handler/instance_handler.h"
 #include "handler/process_state.h"

@@ -7,7 +7,7 @@
 #include "base/flush_denormals.h"
 #include "base/log.h"
 #include "base/numeric_conversion.h"
-#include "base/silence.h"
+#include "convolution/simd/kernels.h"
 #include "handler/block_copy.h"
 #include "handler/process_state.h"
 #include "host/effect_registry.h"
@@ -157,8 +157,8 @@ void sendToReverbs(SpatializerEffect& effect,
     }
     // Silence adds nothing; any other channel count than these two neither. What the handler found
     // does not count: a host may use one buffer for both directions.
-    const bool adds =
-        (inchannels == 1 || inchannels == 2) && !isSilent(in, floatsIn(length, inchannels));
+    const bool adds = (inchannels == 1 || inchannels == 2) &&
+                      !selectKernels().signal->isSilent(floatsIn(length, inchannels), in);
     for (std::size_t i = 0; i < count; ++i) {
         const ReverbSend& send = effect.reverbSends[i];
         ReverbMixBuffer* mix = findMixBuffer(send.id);

@@ -271,6 +271,20 @@ TEST_P(ChangingFarTail, MakesUpForBlocksThatARingHasMissed) {
     EXPECT_LT(worst / largest, 1e-6);
 }
 
+TEST_P(ChangingFarTail, IsBuiltFromWhatACrossfadeBlockBrought) {
+    const int partitions = GetParam().partitions;
+    for (int round = 0; round < 4; ++round) {
+        write(0, size(), 0.5f);  // all of it, the far part too
+        run(true);
+        for (int n = 0; n < 3 * partitions + round; ++n) {
+            run(false);
+        }
+        EXPECT_TRUE(spared.first->farTailHeard()) << round;
+    }
+    ASSERT_GT(largest, 0.0);
+    EXPECT_LT(worst / largest, 1e-6);
+}
+
 INSTANTIATE_TEST_SUITE_P(Shapes,
                          ChangingResponse,
                          testing::Values(Shape{32, 1},

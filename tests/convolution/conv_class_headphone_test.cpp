@@ -166,6 +166,32 @@ TEST_F(ConvClassHeadphone, ComesAndGoesWhileOnePartitionPlays) {
     }
 }
 
+TEST_F(ConvClassHeadphone, ComesAndGoesWithoutTakingWhatWasWrittenMeanwhile) {
+    ConvolverRig rig(32, 1);
+    lend(rig, 64);
+    FirNotes notes;
+    rig.makeFirst();
+    rig.first->watch(&notes, 0);  // keeps no copies, as in an engine
+    fillFilters(rig);
+    const std::vector<float> taken = rig.filterLeft;
+    notes.written.include(0, static_cast<int>(rig.filterLeft.size()));
+    rig.feed(noise_.samples(32));
+    rig.run(true);
+
+    std::ranges::fill(rig.filterLeft, 0.0f);  // a stop, or a block that was not made
+    rig.hpTFactive = true;
+    rig.hpTFselect = 1;
+    rig.feed(noise_.samples(32));
+    rig.run(false);
+    rig.hpTFactive = false;
+    rig.feed(noise_.samples(32));
+    rig.run(false);
+    RingModel model(32, 1);
+    model.setResponse(taken);
+    model.ring[0].assign(rig.window.begin(), rig.window.end());
+    expectNear(model.output(model.ring, 0), rig.firstLeft, 32);
+}
+
 TEST_F(ConvClassHeadphone, LaterInstancesReadTheCommonSpectrumAndMakeNone) {
     const LogCapture log;
     ConvolverRig rig(32, 1);
