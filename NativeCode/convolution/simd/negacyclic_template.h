@@ -3,10 +3,10 @@
 //
 // Only the second half of a block's result is heard, so it may be made by any product of
 // polynomials that leaves this half alone: with u^M = i in place of u^(2M) = 1 a window of 2M reals
-// is M complex points, first half + i second half, and its spectrum the values at the M roots. (The
-// right-angle circular convolution of Nussbaumer, "Fast Fourier Transform and Convolution
-// Algorithms", 1982.) Points need no packing and bins no parting, and bins stay in the order in
-// which the passes leave them.
+// is M complex points, first half + i second half, and its spectrum the values at the M roots: the
+// right-angle convolution of Crandall and Fagin, "Discrete weighted transforms and large-integer
+// arithmetic", Math. Comp. 62, 1994. Points need no packing and bins no parting, and bins stay in
+// the order in which the passes leave them.
 //
 // The points lie in K = M / L rows of L lanes. Passes down the rows split the ring u^M - c into
 // rings of a quarter of the degree, until each row is one of degree L; a pass across the lanes ends
