@@ -172,6 +172,25 @@ TEST_F(ComposerChanges, EqualTheCompositionFromNothingThroughEveryChange) {
     }
 }
 
+TEST_F(ComposerChanges, TheFadeAtTheEndIsAppliedOnceToEachReflectionThatReachesIt) {
+    const LogCapture quiet;
+    setUp(0, false);
+    // Two that end within the last frames, over each other; only one of them changes.
+    for (const int number : {0, 1}) {
+        ReflectionRecord& record = reflections.records[static_cast<std::size_t>(number)];
+        record.delaySamples =
+            static_cast<std::int16_t>(sizes.FIR_size - switches.hrirLength - 2 - 5 * number);
+        record.gain = 1.0f;
+    }
+    for (int n = 0; n < 4; ++n) {
+        reflections.records[0].distanceGain = 0.5f + 0.1f * static_cast<float>(n);
+        composeBoth();
+        take();
+        ASSERT_LT(worst, 2e-7) << n;
+    }
+    EXPECT_NE(composer.filterLeft[sizes.FIR_size - 5], 0.0f) << "else nothing is faded";
+}
+
 TEST_F(ComposerChanges, TheSyntheticTailIsMadeAgainEachTime) {
     const LogCapture quiet;
     setUp(0, false);
