@@ -165,38 +165,41 @@ TEST_F(ReplacedHrirs, AfterTwoLoadsItIsWrittenWithThoseOfNow) {
     EXPECT_EQ(wake(), now);
 }
 
-TEST_F(EngineFixture, AHeadphoneSelectionFindsTheResponseThatNobodyHeardWritten) {
-    // It silences what was taken before it until the next update: what was put off is no update.
-    TempDirectory directory;
-    writePackedHrirSet(directory.path(), 48000);
-    const LogCapture quiet;
-    EngineRig rig(directory.path(), 48000, block);
-    rig.settings.qvTrackDirection = 1;
-    rig.settings.alwaysUpdateFilter = 0;
-    rig.build();
-    for (int n = 0; n < 40; ++n) {
-        rig.azimuth = static_cast<std::int16_t>(n * 5);
-        rig.run();
+/// A source that has moved while nobody heard it.
+class MovedInSilence : public EngineFixture {
+protected:
+    MovedInSilence() : rig(directory_.path(), 48000, block) {
+        writePackedHrirSet(directory_.path(), 48000);
+        rig.settings.qvTrackDirection = 1;
     }
-    ASSERT_TRUE(rig.state().composer.isBehind());
+    void move() {
+        rig.build();
+        for (int n = 0; n < 40; ++n) {
+            rig.azimuth = static_cast<std::int16_t>(n * 5);
+            rig.run();
+        }
+        ASSERT_TRUE(rig.state().composer.isBehind());
+    }
+
+private:
+    TempDirectory directory_;
+    LogCapture quiet_;
+
+protected:
+    EngineRig rig;
+};
+
+TEST_F(MovedInSilence, AHeadphoneSelectionFindsTheResponseThatNobodyHeardWritten) {
+    // It silences what was taken before it until the next update: what was put off is no update.
+    rig.settings.alwaysUpdateFilter = 0;
+    move();
     rig.state().firstOLS->hpTFselectSeen = 7;  // as if the process's selection had changed
     rig.run();
     EXPECT_FALSE(rig.state().composer.isBehind());
 }
 
-TEST_F(EngineFixture, AStopWritesTheResponseThatNobodyHeard) {
-    TempDirectory directory;
-    writePackedHrirSet(directory.path(), 48000);
-    const LogCapture quiet;
-    EngineRig rig(directory.path(), 48000, block);
-    rig.settings.qvTrackDirection = 1;
-    rig.settings.alwaysUpdateFilter = 1;
-    rig.build();
-    for (int n = 0; n < 40; ++n) {
-        rig.azimuth = static_cast<std::int16_t>(n * 5);
-        rig.run();
-    }
-    ASSERT_TRUE(rig.state().composer.isBehind());
+TEST_F(MovedInSilence, AStopWritesTheResponseThatNobodyHeard) {
+    move();
     const ComplexBin before = rig.state().firstOLS->filterPartsL[0][9];
     rig.engine->Stop();
     EXPECT_FALSE(rig.state().composer.isBehind());

@@ -64,6 +64,17 @@ TESSALY_KERNEL_INLINE void transformRows(Complex<Lanes> (&x)[Radix]) {
     }
 }
 
+/// A ring's root and its powers, from 1 on. @return the roots of the next ring
+template <class Lanes, Index Radix>
+TESSALY_KERNEL_INLINE const float* broadcastRoots(const float* roots,
+                                                  Complex<Lanes> (&root)[Radix]) {
+    TESSALY_KERNEL_UNROLL
+    for (Index t = 1; t < Radix; ++t) {
+        root[t] = broadcastRoot<Lanes>(roots + 2 * (t - 1));
+    }
+    return roots + 2 * (Radix - 1);
+}
+
 /// Splits each of `rings` rings of n rows into `Radix`. In place, but for the first pass.
 template <class Lanes, Index Radix, class Source>
 TESSALY_KERNEL_INLINE void splitRings(
@@ -71,11 +82,7 @@ TESSALY_KERNEL_INLINE void splitRings(
     const Index step = n / Radix;
     for (Index ring = 0; ring < rings; ++ring) {
         Complex<Lanes> root[Radix];
-        TESSALY_KERNEL_UNROLL
-        for (Index t = 1; t < Radix; ++t) {
-            root[t] = broadcastRoot<Lanes>(roots + 2 * (t - 1));
-        }
-        roots += 2 * (Radix - 1);
+        roots = broadcastRoots(roots, root);
         for (Index p = ring * n; p < ring * n + step; ++p) {
             Complex<Lanes> x[Radix];
             x[0] = source(p);
@@ -321,11 +328,7 @@ TESSALY_KERNEL_INLINE void joinRings(
     }
     for (Index ring = 0; ring < rings; ++ring) {
         Complex<Lanes> root[Radix];
-        TESSALY_KERNEL_UNROLL
-        for (Index t = 1; t < Radix; ++t) {
-            root[t] = broadcastRoot<Lanes>(roots + 2 * (t - 1));
-        }
-        roots += 2 * (Radix - 1);
+        roots = broadcastRoots(roots, root);
         for (Index p = ring * n; p < ring * n + step; ++p) {
             Complex<Lanes> x[Radix];
             TESSALY_KERNEL_UNROLL
