@@ -1,4 +1,4 @@
-// One block of partitioned convolution, plain or with a crossfade.
+// One block of partitioned convolution.
 #include <algorithm>
 #include <utility>
 
@@ -10,6 +10,8 @@ namespace tessaly {
 
 float* convClass::process() noexcept {
     followCompensation();
+    continuation_.forget();
+    settle();
     watchSelection();
     // In a crossfade block the first instance works on the spectrum that the second one made.
     const bool borrowed = secondOLSactive && isSecondInstance == 0;
@@ -26,6 +28,12 @@ float* convClass::process() noexcept {
 void convClass::rest(convClass* taker) noexcept {
     convClass& owner = taker != nullptr ? *taker : *this;
     owner.ring_.set(owner.newestSlot(), true, blockNumber());
+    if (taker != nullptr) {
+        followRing(*taker);
+        continuation_.takeSilence();
+    } else {
+        continuation_.forget();
+    }
     advanceFarTail(true);
 }
 
@@ -71,15 +79,17 @@ std::int32_t convClass::transformPartition(const float* samples, ComplexBin* spe
 }
 
 /// The first `samples` of the block at least, of both ears.
-void convClass::transformBack(std::int32_t samples) noexcept {
-    const auto back = [&](const ComplexBin* sum, float* output) noexcept {
+/// @param alsoWrapped  and what they go on to be
+void convClass::transformBack(std::int32_t samples, bool alsoWrapped) noexcept {
+    const auto back = [&](const ComplexBin* sum, float* output, std::size_t ear) noexcept {
         if (naturalOrder_ || output == nullptr) {
             return IFFT(sum, output, ifftHandle);
         }
-        return blockIFFT(sum, output + blockLength, samples, ifftHandle);
+        return blockIFFT(sum, output + blockLength, samples, ifftHandle,
+                         alsoWrapped ? continuation_.wrapped(ear) : WrappedSamples{});
     };
-    dftiStatus = back(accumL, outputL);
-    dftiStatus = back(accumR, outputR);
+    dftiStatus = back(accumL, outputL, 0);
+    dftiStatus = back(accumR, outputR, 1);
 }
 
 convClass::RingView convClass::ownRing() const noexcept {
@@ -107,7 +117,8 @@ bool convClass::canSum(const RingView& ring, bool compensated) const noexcept {
 }
 
 /// One block from a ring with the spectra as they stand.
-void convClass::render(const RingView& ring, const RingView& other) noexcept {
+/// @param goesOn  the result may go on in the next block
+void convClass::render(const RingView& ring, const RingView& other, bool goesOn) noexcept {
     const bool compensated = hpTFactive && FDLtoBUFConv == 1;
     farHeard_ = false;
     if (ring.state != nullptr && ring.state->silent() && ifftHandle != nullptr) {
@@ -124,9 +135,11 @@ void convClass::render(const RingView& ring, const RingView& other) noexcept {
     } else if (complete) {
         farHeard_ = findFarCorrections(ring, other, scaled_, scaled_);
         const Layout layout = layoutOf(scaled_);
-        const auto all = [](std::size_t) { return true; };
-        collect(ring, 0, layout.scaledBegin, all);
+        collect(ring, 0, layout.scaledBegin, Pick::all);
         summed = sums_.store(accumulators());
+        if (owedCount_ > 0) {
+            summed = addOwed(ring, summed);
+        }
     }
     if (!summed) {
         clearSpectrum(accumL, binCount - 1);
@@ -134,12 +147,16 @@ void convClass::render(const RingView& ring, const RingView& other) noexcept {
     }
     if (complete && !compensated) {
         const Layout layout = layoutOf(scaled_);
-        collect(ring, layout.scaledBegin, layout.end, [](std::size_t) { return true; });
+        collect(ring, layout.scaledBegin, layout.end, Pick::all);
         addFarHeld();
         sums_.addTo(accumulators(), layout.gain);
         subtractFarExpected(accumulators(), layout.gain);
     }
-    transformBack(blockLength);
+    const bool kept = goesOn && complete && !compensated;
+    transformBack(blockLength, kept);
+    if (kept) {
+        keepResult(layoutOf(scaled_).end);
+    }
     if (farHeard_) {
         far_->addTo(outputL + blockLength, outputR + blockLength, layoutOf(scaled_).gain,
                     blockLength);
@@ -166,17 +183,57 @@ convClass::Layout convClass::layoutOf(const ScaledPartitions& scaled) const noex
                : Layout{end, end, scaled.begin < filterPartsL.size() ? scaled.gain : 1.0f};
 }
 
+/// Partitions whose spectra nobody keeps: each is made and used at once, in the nearest cache.
+/// @param summed  there is a sum to add to
+/// @return whether there is one now
+bool convClass::addOwed(const RingView& ring, bool summed) noexcept {
+    const auto partitions = static_cast<std::size_t>(FDLtoBUFConv);
+    std::int32_t pairs = 0;
+    const auto sum = [&] {
+        if (summed) {
+            sums_.addTo(accumulators());
+        } else {
+            summed = sums_.store(accumulators());
+        }
+        sums_.begin();
+        pairs = 0;
+    };
+    sums_.begin();
+    for (std::size_t i = 0; i < owed_.size(); ++i) {
+        if (owed_[i] == 0) {
+            continue;
+        }
+        ComplexBin* const left = passing_ + std::ptrdiff_t{2} * pairs * stride_;
+        ComplexBin* const right = left + stride_;
+        takePartition(i, left, right);
+        const std::size_t slot = (ring.newest + partitions - i) % partitions;
+        if (silent_[i] != 0 || ring.state->silent(slot)) {
+            continue;
+        }
+        sums_.add(ring.spectra[slot], left, right);
+        if (++pairs == passingPairs) {
+            sum();
+        }
+    }
+    if (pairs > 0) {
+        sum();
+    }
+    return summed;
+}
+
 /// Pairs the chosen partitions in [begin, end) with their inputs. What is known to be zero is left
 /// out.
-template <typename Choice>
 void convClass::collect(const RingView& ring,
                         std::size_t begin,
                         std::size_t end,
-                        Choice&& chosen) noexcept {
+                        Pick pick) noexcept {
     const auto partitions = static_cast<std::size_t>(FDLtoBUFConv);
     sums_.begin();
     for (std::size_t i = begin; i < end; ++i) {
-        if (silent_[i] != 0 || !chosen(i)) {
+        const bool touched = changed_[i] != 0;
+        const bool owed = i < owed_.size() && owed_[i] != 0;
+        if (silent_[i] != 0 || owed ||
+            (touched ? pick == Pick::untouched : pick == Pick::touched)) {
             continue;
         }
         // Partition i meets the input of i blocks ago.
@@ -254,144 +311,6 @@ void convClass::subtractFarExpected(const EarSpectra& sum, float gain) noexcept 
                       filterPartsR[expected.partition]);
         }
         sums_.addTo(sum, -gain);
-    }
-}
-
-/// The plain order of a crossfade block, for all cases that the shared sum does not cover.
-void convClass::borrowAndProcess(convClass& second) noexcept {
-    second.scaled_ = scaled_;  // it renders with these spectra as they stand
-    second.process();
-    std::copy(second.FDL.begin(), second.FDL.end(), FDL.begin());
-    process();
-    std::copy(FDLown.begin(), FDLown.end(), FDL.begin());
-}
-
-/// Both have all their memory and read the same spectra; once found so, that stays.
-bool convClass::sharesWith(const convClass& second) noexcept {
-    if ((hpTFactive && FDLtoBUFConv == 1) || second.newestSlot() != newestSlot()) {
-        return false;
-    }
-    if (partner_ == &second) {
-        return true;
-    }
-    const bool shares = directFilterFeed == 0 && isSecondInstance == 0 &&
-                        second.isSecondInstance != 0 && second.FDLtoBUFConv == FDLtoBUFConv &&
-                        second.binCount == binCount && fftHandle != nullptr &&
-                        ifftHandle != nullptr && second.fftHandle != nullptr &&
-                        second.ifftHandle != nullptr && second.accumulators().complete() &&
-                        canSum(second.ownRing(), false) && second.filterPartsL == filterPartsL &&
-                        second.filterPartsR == filterPartsR;
-    partner_ = shares ? &second : nullptr;
-    return shares;
-}
-
-void convClass::processCrossfade(convClass& second, std::int32_t heardOfOld) noexcept {
-    followCompensation();
-    if (naturalOrder_ && !second.naturalOrder_) {
-        second.useNaturalOrder();  // it has slept while compensation came and went
-    }
-    if (!sharesWith(second)) {
-        borrowAndProcess(second);
-        return;
-    }
-    second.watchSelection();
-    second.resultSilent_ = false;  // its results are written here, past its own knowledge
-    const bool silent = second.takeInput(blockNumber());
-    watchSelection();
-    const bool update = filterChangeAll || forceUpdateAll;
-    if (update && hpTFactive) {
-        fullLengthBranch();
-    }
-    changedCount_ = 0;
-    changedTaps_ = 0;
-    const ScaledPartitions before = scaled_;
-    if (update) {
-        findChangedPartitions();
-        scaled_ = scaledNow();
-    }
-    advanceFarTail(silent, changedCount_ == 0);
-    const RingView ring = second.ownRing();
-    const std::int32_t heard = std::clamp(heardOfOld, 0, blockLength);
-    if (changedCount_ > 0 && ring.state->silent()) {
-        transformChanged();
-        changedCount_ = 0;
-    }
-    const bool byTaps = changedTaps_ > 0 && before == scaled_ && scaled_.begin > 0;
-    if (changedCount_ > 0 && byTaps) {
-        transformChanged();
-        changedCount_ = 0;
-    }
-    if (ring.state->silent() || (changedCount_ == 0 && before == scaled_)) {
-        render(ring, ownRing());
-        std::copy_n(outputL + blockLength, heard, second.outputL + blockLength);
-        std::copy_n(outputR + blockLength, heard, second.outputR + blockLength);
-        if (byTaps && !ring.state->silent()) {
-            renderOldByTaps(second, heard);
-        }
-        return;
-    }
-    renderBoth(second, before, heard);
-}
-
-/// What a change of few taps of the start takes away, in the time domain: the old response's
-/// samples from the new one's. The first partition always meets the window of this very block.
-void convClass::renderOldByTaps(convClass& second, std::int32_t heard) noexcept {
-    kernels_->addTaps(static_cast<std::size_t>(heard), static_cast<std::size_t>(changedTaps_),
-                      startChange_.data(), startChange_.data() + directTaps, input + blockLength,
-                      second.outputL + blockLength, second.outputR + blockLength);
-}
-
-/// Old and new response share what no update touched, and the end of them without its gain.
-void convClass::renderBoth(convClass& second,
-                           const ScaledPartitions& before,
-                           std::int32_t heard) noexcept {
-    const RingView ring = second.ownRing();
-    resultSilent_ = false;
-    farHeard_ = findFarCorrections(ring, ownRing(), before, scaled_);
-    const Layout old = layoutOf(before);
-    const Layout now = layoutOf(scaled_);
-    const std::size_t lastBegin = std::max(old.scaledBegin, now.scaledBegin);
-    const auto untouched = [this](std::size_t i) { return changed_[i] == 0; };
-    const auto touched = [this](std::size_t i) { return changed_[i] != 0; };
-
-    collect(ring, 0, lastBegin, untouched);
-    if (!sums_.store(accumulators())) {
-        clearSpectrum(accumL, binCount - 1);
-        clearSpectrum(accumR, binCount - 1);
-    }
-    collect(ring, lastBegin, old.end, untouched);
-    addFarHeld();
-    bool hasEnd = sums_.store(end_);
-    if (farHeard_ && !farExpected_.empty()) {
-        if (!hasEnd) {
-            clearSpectrum(end_.left, binCount - 1);
-            clearSpectrum(end_.right, binCount - 1);
-        }
-        subtractFarExpected(end_, 1.0f);
-        hasEnd = true;
-    }
-    if (hasEnd && old.gain == now.gain) {
-        sums_.addScaled(end_, now.gain, accumulators());
-        hasEnd = false;
-    }
-    const auto addOwn = [&](const Layout& layout, const EarSpectra& sum) {
-        collect(ring, 0, layout.scaledBegin, touched);
-        sums_.store(accumulators(), sum);
-        collect(ring, layout.scaledBegin, layout.end, touched);
-        sums_.addTo(sum, layout.gain);
-        if (hasEnd) {
-            sums_.addScaled(end_, layout.gain, sum);
-        }
-    };
-
-    addOwn(old, second.accumulators());
-    second.transformBack(heard);
-    transformChanged();
-    addOwn(now, accumulators());
-    transformBack(blockLength);
-    if (farHeard_) {
-        far_->addTo(second.outputL + blockLength, second.outputR + blockLength, old.gain, heard);
-        far_->addTo(outputL + blockLength, outputR + blockLength, now.gain, blockLength);
     }
 }
 

@@ -48,6 +48,26 @@ void allocKeptSpectrum(ComplexBin*& slot, std::int32_t count) noexcept {
     }
 }
 
+/// Spectra that are made and used at once, by one convolver after the other as the process's flags
+/// want it anyway: what all sources share stays in the nearest cache. A convolver keeps the array
+/// that it found, so those that have become too short stay, too.
+using PassingSpectra = std::vector<AlignedArray<ComplexBin>>;
+
+PassingSpectra& passingSpectra() noexcept {
+    static ProcessLifetime<PassingSpectra> arrays;
+    return *arrays;
+}
+
+/// At least so many bins. @throws std::bad_alloc
+ComplexBin* findPassingSpectra(std::int32_t bins) {
+    PassingSpectra& arrays = passingSpectra();
+    const auto wanted = static_cast<std::size_t>(bins);
+    if (arrays.empty() || arrays.back().size() < wanted) {
+        arrays.emplace_back(wanted);
+    }
+    return arrays.back().data();
+}
+
 /// Points `entries` at consecutive spectra of one block; all null without memory for it.
 void carveSpectra(std::vector<ComplexBin*>& entries, ComplexBin*& memory, std::int32_t stride) {
     const std::int64_t bins = static_cast<std::int64_t>(entries.size()) * stride;
@@ -70,6 +90,7 @@ void resetConvolutionState() noexcept {
     HpTF_FreqBins = 0;
     hpTFtimeLength = 0;
     keptSpectra().release();
+    passingSpectra().clear();
 }
 
 convClass::convClass(std::string instanceNameIn,
@@ -239,6 +260,24 @@ void convClass::splitFarTail(std::int32_t ratio) {
     }
 }
 
+void convClass::continueResults(bool told) {
+    const std::size_t partitions = far_ != nullptr ? far_->firstPartition() : filterPartsL.size();
+    if (isSecondInstance != 0 || directFilterFeed != 0 || blockLength < Continuation::samples ||
+        partitions >= static_cast<std::size_t>(FarTail::fewestPartitions)) {
+        return;
+    }
+    try {
+        if (told) {
+            passing_ = findPassingSpectra(2 * passingPairs * stride_);
+            owed_.assign(partitions, 0);
+            changedBefore_.assign(partitions, 0);
+        }
+        continuation_.prepare(*kernels_, blockLength, partitions);
+    } catch (const std::bad_alloc&) {
+        logTrace("no memory for results that go on, each old response is convolved");
+    }
+}
+
 void convClass::useNaturalOrder() noexcept {
     naturalOrder_ = true;
     sums_.useNaturalOrder();
@@ -260,6 +299,7 @@ void convClass::followCompensation() noexcept {
 /// The responses may have been written since they were taken, so their samples come from the
 /// spectra: delayed by a block they stand in the half that a block spectrum gives back.
 void convClass::reorderResponse() noexcept {
+    settle();
     const bool complete = end_.complete() && accumL != nullptr && filterPartsL[0] != nullptr &&
                           filterPartsR[0] != nullptr && sums_.ready() && !padded_.empty();
     if (!complete || silent_[0] != 0) {
@@ -299,6 +339,7 @@ void convClass::clearFDL() noexcept {
     if (far_ != nullptr) {
         far_->clear();
     }
+    continuation_.forget();
 }
 
 void convClass::HpTF_Freq() noexcept {

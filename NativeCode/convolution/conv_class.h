@@ -7,6 +7,7 @@
 #include <vector>
 
 #include "base/aligned_array.h"
+#include "convolution/continuation.h"
 #include "convolution/far_tail.h"
 #include "convolution/fir_notes.h"
 #include "convolution/input_ring.h"
@@ -118,6 +119,18 @@ public:
     /// Takes the far part of a long response in larger partitions, of `ratio` blocks, wherever that
     /// gives the same: FarTail. Load time: allocates. Without memory all stays uniform.
     void splitFarTail(std::int32_t ratio);
+    /// In crossfade blocks one after the other the first samples of the old response come from what
+    /// the last result goes on to be. Behind `splitFarTail`, if that is called. Load time:
+    /// allocates. Without memory, and with many or short blocks, each is convolved.
+    /// @param told  `beforeWriting` is called: partitions that change in each of these blocks need
+    ///              not keep their spectra
+    void continueResults(bool told);
+    /// The responses may be written before the next block. Block time.
+    /// @param crossfade  that block will be made, by `processCrossfade` with the same second
+    ///                   instance, and the input window goes on
+    void beforeWriting(bool crossfade) noexcept;
+    /// The last block's old response was continued. For tests.
+    bool oldContinued() const noexcept { return oldContinued_; }
     /// This block's far part came from larger partitions. For tests.
     bool farTailHeard() const noexcept { return farHeard_; }
 
@@ -242,9 +255,22 @@ private:
     std::uint64_t blockNumber() const noexcept;
     void advanceFarTail(bool silent, bool taken = true) noexcept;
     bool canSum(const RingView& ring, bool compensated) const noexcept;
-    void render(const RingView& ring, const RingView& other) noexcept;
+    void render(const RingView& ring, const RingView& other, bool goesOn = false) noexcept;
     void renderSilence() noexcept;
     void renderOldByTaps(convClass& second, std::int32_t heard) noexcept;
+    void followRing(const convClass& second) noexcept;
+    bool mayContinue() const noexcept;
+    bool continuesOld(const RingView& ring,
+                      const ScaledPartitions& before,
+                      std::int32_t heard) noexcept;
+    void continueOld(convClass& second,
+                     const ScaledPartitions& before,
+                     std::int32_t heard) noexcept;
+    void keepResult(std::size_t partitions) noexcept;
+    void chooseOwed() noexcept;
+    void settle() noexcept;
+    bool addOwed(const RingView& ring, bool summed) noexcept;
+    void takePartition(std::size_t partition, ComplexBin* left, ComplexBin* right) noexcept;
     void noteStartChange(std::int32_t taps) noexcept;
     void renderBoth(convClass& second, const ScaledPartitions& before, std::int32_t heard) noexcept;
     std::size_t bins() const noexcept;
@@ -253,7 +279,7 @@ private:
     void reorderResponse() noexcept;
     std::int32_t transformWindow(const float* samples, ComplexBin* spectrum) noexcept;
     std::int32_t transformPartition(const float* samples, ComplexBin* spectrum) noexcept;
-    void transformBack(std::int32_t samples) noexcept;
+    void transformBack(std::int32_t samples, bool alsoWrapped = false) noexcept;
     /// Partitions [0, scaledBegin) of the uniform sums and [scaledBegin, end), which count `gain`
     /// times, as does the far tail behind them.
     struct Layout {
@@ -262,11 +288,8 @@ private:
         float gain;
     };
     Layout layoutOf(const ScaledPartitions& scaled) const noexcept;
-    template <typename Choice>
-    void collect(const RingView& ring,
-                 std::size_t begin,
-                 std::size_t end,
-                 Choice&& chosen) noexcept;
+    enum class Pick : std::uint8_t { all, touched, untouched };  ///< by an update
+    void collect(const RingView& ring, std::size_t begin, std::size_t end, Pick pick) noexcept;
     bool findFarCorrections(const RingView& ring,
                             const RingView& other,
                             const ScaledPartitions& before,
@@ -296,8 +319,21 @@ private:
     std::vector<FarCorrection> farHeld_;
     std::vector<FarCorrection> farExpected_;
 
-    bool naturalOrder_ = false;   ///< of all spectra; once so, for good
-    AlignedArray<float> padded_;  ///< a partition and B zeros, for natural order
+    Continuation continuation_;  ///< of this instance's results from the second one's ring
+    const convClass* followed_ = nullptr;  ///< whose ring its windows came to
+    std::uint64_t followedWrites_ = 0;     ///< that the ring had seen then
+    std::size_t followedSlot_ = 0;
+    bool oldContinued_ = false;
+
+    /// Per partition: the spectrum is not that of its samples, which stand in the responses and go
+    /// through `addOwed`. For partitions that change in each block.
+    std::vector<std::uint8_t> owed_;
+    std::int32_t owedCount_ = 0;
+    static constexpr std::int32_t passingPairs = 2;
+    ComplexBin* passing_ = nullptr;  ///< so many pairs of spectra on their way, `stride_` apart
+    std::vector<std::uint8_t> changedBefore_;  ///< as `changed_`, in the block before
+    bool naturalOrder_ = false;                ///< of all spectra; once so, for good
+    AlignedArray<float> padded_;               ///< a partition and B zeros, for natural order
     PartitionSums sums_;
     EarSpectra end_;  ///< sum over the scaled end, without its gain
 

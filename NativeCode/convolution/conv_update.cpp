@@ -17,12 +17,14 @@ void convClass::updateFilter() noexcept {
 
 void convClass::takeResponses() noexcept {
     followCompensation();
+    continuation_.forget();
     if (directFilterFeed != 0) {
         feedDirectly(firL, timePartsL, filterPartsL);
         feedDirectly(firR, timePartsR, filterPartsR);
     } else {
         findChangedPartitions();
         transformChanged();
+        settle();
     }
     if (hpTFactive && FDLtoBUFConv == 1) {
         multiplyHeadphone(filterPartsL[0], hpTFspectrumL, binCount);
@@ -115,25 +117,43 @@ void convClass::transformChanged() noexcept {
         std::copy_n(firL, taps, startTaps_.data());
         std::copy_n(firR, taps, startTaps_.data() + directTaps);
     }
+    for (std::size_t i = 0; i < changed_.size(); ++i) {
+        const bool owed = i < owed_.size() && owed_[i] != 0;
+        if (changed_[i] != 0 && !owed) {
+            takePartition(i, filterPartsL[i], filterPartsR[i]);
+        }
+    }
+}
+
+/// A partition of the responses as it stands now, and its spectra.
+void convClass::takePartition(std::size_t partition, ComplexBin* left, ComplexBin* right) noexcept {
     const auto length = static_cast<std::size_t>(blockLength);
+    const std::size_t start = partition * length;
     const auto take = [&](const float* fir, float* kept, ComplexBin* spectrum) noexcept {
         if (fir == nullptr) {
             return false;
         }
         if (kept != nullptr) {
-            std::memcpy(kept, fir, length * sizeof(float));
+            std::memcpy(kept, fir + start, length * sizeof(float));
         }
-        dftiStatus = transformPartition(fir, spectrum);
-        return allZero(fir, length);
+        dftiStatus = transformPartition(fir + start, spectrum);
+        return allZero(fir + start, length);
     };
-    for (std::size_t i = 0; i < changed_.size(); ++i) {
-        if (changed_[i] != 0) {
-            const std::size_t start = i * length;
-            const bool leftSilent =
-                take(firL != nullptr ? firL + start : nullptr, timePartsL[i], filterPartsL[i]);
-            const bool rightSilent =
-                take(firR != nullptr ? firR + start : nullptr, timePartsR[i], filterPartsR[i]);
-            silent_[i] = leftSilent && rightSilent && dftiStatus == transformOk ? 1 : 0;
+    const bool leftSilent = take(firL, timePartsL[partition], left);
+    const bool rightSilent = take(firR, timePartsR[partition], right);
+    if (firL != nullptr && firR != nullptr) {
+        continuation_.takeTaps(partition, firL + start, firR + start);
+    }
+    silent_[partition] = leftSilent && rightSilent && dftiStatus == transformOk ? 1 : 0;
+}
+
+/// Makes the spectra of all partitions that had none.
+void convClass::settle() noexcept {
+    for (std::size_t i = 0; i < owed_.size() && owedCount_ > 0; ++i) {
+        if (owed_[i] != 0) {
+            owed_[i] = 0;
+            --owedCount_;
+            takePartition(i, filterPartsL[i], filterPartsR[i]);
         }
     }
 }

@@ -42,6 +42,8 @@ public:
     void useNaturalOrder() noexcept { naturalOrder_ = true; }
 
     void begin() noexcept { count_ = 0; }
+    /// No pair has been added.
+    bool empty() const noexcept { return count_ == 0; }
     /// Pairs beyond the prepared number are dropped. Block time.
     void add(const ComplexBin* input, const ComplexBin* left, const ComplexBin* right) noexcept {
         if (count_ < inputs_.size()) {

@@ -234,12 +234,15 @@ std::int32_t computePartition(const TransformHandle& handle,
 std::int32_t computeBlock(const TransformHandle& handle,
                           const ComplexBin* input,
                           float* output,
-                          std::int32_t samples) noexcept {
+                          std::int32_t samples,
+                          WrappedSamples wrapped) noexcept {
     return compute(handle, input, output,
                    ofBlocks([=](const Kernels& kernels, const BlockTables& tables, float* work) {
-                       const auto wanted =
-                           static_cast<std::size_t>(std::clamp(samples, 0, tables.points));
-                       kernels.block(tables, input, output, work, wanted);
+                       const auto upTo = [&](std::int32_t wanted) {
+                           return static_cast<std::size_t>(std::clamp(wanted, 0, tables.points));
+                       };
+                       kernels.block(tables, input, output, work, upTo(samples), wrapped.output,
+                                     wrapped.output != nullptr ? upTo(wrapped.samples) : 0);
                    }));
 }
 
@@ -287,8 +290,9 @@ std::int32_t IFFT(const ComplexBin* input, float* output, const TransformHandle&
 std::int32_t blockIFFT(const ComplexBin* input,
                        float* output,
                        std::int32_t samples,
-                       const TransformHandle& handle) noexcept {
-    return reportBackward(computeBlock(handle, input, output, samples));
+                       const TransformHandle& handle,
+                       WrappedSamples wrapped) noexcept {
+    return reportBackward(computeBlock(handle, input, output, samples, wrapped));
 }
 
 void allocSpectrum(ComplexBin*& slot, std::int32_t count) noexcept {

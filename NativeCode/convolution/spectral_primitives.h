@@ -67,12 +67,19 @@ std::int32_t computeWindow(const TransformHandle& handle,
 std::int32_t computePartition(const TransformHandle& handle,
                               const float* input,
                               ComplexBin* output) noexcept TESSALY_NONBLOCKING;
+/// The start of the other half of such a result: what the half that is heard gives, continued by B
+/// samples, is taken away there from the product's own start (u^2B = -1).
+struct WrappedSamples {
+    float* output = nullptr;   ///< room for `samples` and 15 more, up to B; null: none wanted
+    std::int32_t samples = 0;  ///< samples 0 to `samples` - 1 of the window, up to B
+};
 /// B bins to samples B to B + `samples` - 1 of the window, 2B times as computeBackward gives them.
 /// `output` has room for B floats; those behind the samples are undefined. Block time.
 std::int32_t computeBlock(const TransformHandle& handle,
                           const ComplexBin* input,
                           float* output,
-                          std::int32_t samples) noexcept TESSALY_NONBLOCKING;
+                          std::int32_t samples,
+                          WrappedSamples wrapped = {}) noexcept TESSALY_NONBLOCKING;
 /// A committed plan of which only the three above can be used. Load time: allocates.
 /// @return a status; on failure the handle is null
 std::int32_t createBlockTransform(TransformHandle& handle, std::int32_t length) noexcept;
@@ -98,7 +105,8 @@ std::int32_t IFFT(const ComplexBin* input, float* output, const TransformHandle&
 std::int32_t blockIFFT(const ComplexBin* input,
                        float* output,
                        std::int32_t samples,
-                       const TransformHandle& handle) noexcept;
+                       const TransformHandle& handle,
+                       WrappedSamples wrapped = {}) noexcept;
 
 /// Fills `slot` with `count` zeroed bins on a 64-byte boundary; load time. On failure (no memory,
 /// or a count below 1) the slot is null, `essError` is -202 and a trace line tells.

@@ -112,6 +112,7 @@ CompositionInputs compositionInputs(EngineState& state) noexcept {
 }
 
 void composeResponse(EngineState& state) noexcept {
+    state.firstOLS->beforeWriting(isCrossfadeBlock(state) && essError == essErrorNone);
     CompositionInputs inputs = compositionInputs(state);
     inputs.unheard = watchSilence(state);
     if (!inputs.unheard) {

@@ -23,10 +23,9 @@ protected:
         EXPECT_EQ(createFFT(handle, static_cast<std::int32_t>(length)), transformOk);
         return handle;
     }
-    /// What `block` gives for a window and a partition of half its length.
-    static std::vector<float> convolved(const TransformHandle& handle,
-                                        const std::vector<float>& window,
-                                        const std::vector<float>& partition) {
+    static std::vector<ComplexBin> product(const TransformHandle& handle,
+                                           const std::vector<float>& window,
+                                           const std::vector<float>& partition) {
         const std::size_t length = partition.size();
         std::vector<ComplexBin> input(length);
         std::vector<ComplexBin> response(length);
@@ -39,6 +38,14 @@ protected:
         GetParam()->sumOfProducts(GetParam()->transformLanes(static_cast<std::int32_t>(length)),
                                   length, 1, &x, &h, &h, nullptr, nullptr, sum.data(),
                                   unused.data());
+        return sum;
+    }
+    /// What `block` gives for a window and a partition of half its length.
+    static std::vector<float> convolved(const TransformHandle& handle,
+                                        const std::vector<float>& window,
+                                        const std::vector<float>& partition) {
+        const std::size_t length = partition.size();
+        const std::vector<ComplexBin> sum = product(handle, window, partition);
         std::vector<float> output(length + 1, 99.0f);
         EXPECT_EQ(blockIFFT(sum.data(), output.data(), static_cast<std::int32_t>(length), handle),
                   transformOk);
@@ -132,6 +139,55 @@ TEST_P(BlockSpectra, FewerSamplesAreThoseOfTheWholeBlockBitForBit) {
                 ASSERT_EQ(got[i], expected[i]) << i;
             }
             EXPECT_EQ(got.back(), 99.0f);
+        }
+    }
+}
+
+TEST_P(BlockSpectra, WrappedSamplesAreTheProductsStartLessWhatItGoesOnToBe) {
+    for (std::size_t length = 2; length <= 2048; length *= 2) {
+        SCOPED_TRACE(length);
+        const TransformHandle handle = plan(2 * length);
+        Noise noise(static_cast<std::uint32_t>(length));
+        const std::vector<float> window = noise.samples(2 * length);
+        const std::vector<float> partition = noise.samples(length);
+        const std::vector<ComplexBin> sum = product(handle, window, partition);
+        const auto samples = static_cast<double>(length);
+        const double scale = 2.0 * samples * std::sqrt(samples);
+        std::vector<double> expected(length);
+        for (std::size_t n = 0; n < length; ++n) {
+            for (std::size_t j = 0; j < length; ++j) {
+                const double tap = static_cast<double>(partition[j]);
+                expected[n] += j <= n ? tap * static_cast<double>(window[n - j])
+                                      : -tap * static_cast<double>(window[2 * length + n - j]);
+            }
+            expected[n] *= 2.0 * samples;
+        }
+        const auto all = static_cast<std::int32_t>(length);
+        std::vector<float> block(length);
+        ASSERT_EQ(blockIFFT(sum.data(), block.data(), all, handle), transformOk);
+        for (const std::size_t wanted : {std::size_t{0}, std::size_t{1}, std::size_t{16},
+                                         std::size_t{64}, length / 2, length, length + 7}) {
+            SCOPED_TRACE(wanted);
+            const std::size_t count = std::min(wanted, length);
+            const std::size_t vectors = std::min((count + 15) / 16 * 16, std::max(length, count));
+            std::vector<float> again(length);
+            std::vector<float> wrapped(length + 16, 99.0f);
+            ASSERT_EQ(blockIFFT(sum.data(), again.data(), all, handle,
+                                {wrapped.data(), static_cast<std::int32_t>(wanted)}),
+                      transformOk);
+            EXPECT_EQ(again, block) << "whatever else is made";
+            for (std::size_t n = 0; n < count; ++n) {
+                ASSERT_NEAR(static_cast<double>(wrapped[n]), expected[n], 1e-6 * scale) << n;
+            }
+            EXPECT_EQ(wrapped[vectors], 99.0f) << "wrote behind them";
+            // Nor do they need the others.
+            std::vector<float> alone(length + 16, 99.0f);
+            ASSERT_EQ(blockIFFT(sum.data(), again.data(), 0, handle,
+                                {alone.data(), static_cast<std::int32_t>(wanted)}),
+                      transformOk);
+            for (std::size_t i = 0; i < count; ++i) {
+                ASSERT_EQ(alone[i], wrapped[i]) << i;
+            }
         }
     }
 }

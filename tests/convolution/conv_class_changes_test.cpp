@@ -12,8 +12,6 @@
 namespace tessaly::test {
 namespace {
 
-constexpr std::int32_t heard = 16;
-
 struct Shape {
     std::int32_t blockLength;
     std::int16_t partitions;
@@ -41,10 +39,11 @@ protected:
         resetConvolutionState();
         plain.makeBoth();
         spared.makeBoth();
-        spared.heardOfOld = heard;
+        spared.heardOfOld = heard();
         if (GetParam().farRatio > 0) {
             spared.first->splitFarTail(GetParam().farRatio);
         }
+        spared.first->continueResults(true);
         const int size = static_cast<int>(spared.filterLeft.size());
         spared.first->watch(&notes, size);
         notes.scaledEnd = {size, 1.0f};
@@ -55,8 +54,14 @@ protected:
     ChangingResponse& operator=(const ChangingResponse&) = delete;
 
     int block() const { return spared.blockLength; }
+    int heard() const { return std::min(block(), 64); }
     int size() const { return static_cast<int>(spared.filterLeft.size()); }
 
+    /// Before anything is written. @param update  and `goesOn`: the next block is a crossfade block
+    /// whose window follows the last one
+    void begin(bool update, bool goesOn = true) {
+        spared.first->beforeWriting(update && goesOn && spared.blockCounter != 0);
+    }
     /// Writes noise, or silence, into [begin, end) of the response that is spared.
     void write(int begin, int end, float level) {
         for (int i = begin; i < end; ++i) {
@@ -95,8 +100,9 @@ protected:
         compare(plain.firstLeft, spared.firstLeft, block());
         compare(plain.firstRight, spared.firstRight, block());
         if (crossfade) {
-            compare(plain.secondLeft, spared.secondLeft, heard);
-            compare(plain.secondRight, spared.secondRight, heard);
+            compare(plain.secondLeft, spared.secondLeft, heard());
+            compare(plain.secondRight, spared.secondRight, heard());
+            continuedBlocks += spared.first->oldContinued() ? 1 : 0;
         }
         farBlocks += spared.first->farTailHeard() ? 1 : 0;
         const std::int32_t bins = spared.first->binCount;
@@ -121,7 +127,8 @@ protected:
     FirNotes notes;
     Noise noise{11};
     bool silent = false;
-    int farBlocks = 0;  ///< blocks whose far part came from larger partitions
+    int continuedBlocks = 0;  ///< crossfade blocks whose old response was not convolved
+    int farBlocks = 0;        ///< blocks whose far part came from larger partitions
     double largest = 0.0;
     double worst = 0.0;
 };
@@ -131,6 +138,8 @@ TEST_P(ChangingResponse, FollowsThePlainOrderThroughEveryKindOfChange) {
     for (int n = 0; n < 160; ++n) {
         SCOPED_TRACE(n);
         const int kind = static_cast<int>(noise.samples(1)[0] * 1000.0f + 1000.0f) % 10;
+        const bool update = n == 0 || static_cast<int>(noise() * 10.0f) % 4 != 0;
+        begin(update);
         const auto place = [&](int least, int most) {
             const int span = std::max(most - least, 0);
             return least + static_cast<int>((noise() + 1.0f) * 0.5f * static_cast<float>(span));
@@ -170,7 +179,6 @@ TEST_P(ChangingResponse, FollowsThePlainOrderThroughEveryKindOfChange) {
             default:  // nothing
                 break;
         }
-        const bool update = n == 0 || static_cast<int>(noise() * 10.0f) % 4 != 0;
         run(update);
     }
     ASSERT_GT(largest, 0.0);
@@ -182,7 +190,7 @@ TEST_P(ChangingResponse, AnUnchangedResponseGivesTheOldOnesSamplesBitForBit) {
     run(true);
     for (int n = 0; n < 3 * GetParam().partitions; ++n) {
         run(true);
-        for (int i = 0; i < heard; ++i) {
+        for (int i = 0; i < heard(); ++i) {
             const auto at = static_cast<std::size_t>(block() + i);
             ASSERT_EQ(spared.firstLeft[at], spared.secondLeft[at]);
             ASSERT_EQ(spared.firstRight[at], spared.secondRight[at]);
@@ -219,6 +227,7 @@ TEST_P(ChangingResponse, FarTailInLargerPartitionsGivesTheSame) {
     for (int n = 0; n < blocks; ++n) {
         SCOPED_TRACE(n);
         const int kind = static_cast<int>(noise.samples(1)[0] * 1000.0f + 1000.0f) % 64;
+        begin(updates && kind != 28, (kind != 31 || n % 3 != 0) && (kind != 32 || n % 5 != 0));
         if (kind < 24) {
             write(0, block(), 0.5f);
         } else if (kind < 28) {
@@ -248,6 +257,62 @@ TEST_P(ChangingResponse, FarTailInLargerPartitionsGivesTheSame) {
         EXPECT_GT(farBlocks, blocks / 4) << "else this compares nothing";
     } else {
         EXPECT_EQ(farBlocks, 0);
+    }
+}
+
+/// A source that moves: a few stretches of the start, at odd places, in each block anew.
+TEST_P(ChangingResponse, OldResponsesOfARunOfMovesGoOnFromTheLastResult) {
+    const int last = GetParam().farRatio > 0 ? 2 * GetParam().farRatio * block() : size() - block();
+    const int partitions = GetParam().partitions;
+    spared.first->watch(&notes, 0);  // keeps no copies, as in an engine
+    write(last, size(), 0.2f);
+    setEnd(last, 0.5f);
+    int crossfades = 0;
+    const auto move = [&](bool update) {
+        begin(update);
+        write(0, last, 0.0f);
+        const int length = std::min(block() / 2, last);
+        for (int begin = 0; begin + length <= last; begin += 2 * block() - 7) {
+            write(begin, begin + length, 0.5f);
+        }
+        crossfades += update ? 1 : 0;
+        run(update);
+    };
+    run(true);
+    for (int n = 0; n < 3 * partitions + 4; ++n) {
+        SCOPED_TRACE(n);
+        move(true);
+    }
+    for (int round = 0; round < 3; ++round) {
+        SCOPED_TRACE(round);
+        for (int n = 0; n < partitions + 3; ++n) {
+            move(true);
+        }
+        // It stops, and is heard with all that was not kept: plain, or in a crossfade with nothing
+        // new, or while its end changes.
+        begin(round > 0);
+        if (round == 2) {
+            setEnd(last, -0.25f);
+        }
+        run(round > 0);
+        run(false);
+    }
+    if (last + 2 * block() < size()) {
+        for (int n = 0; n < 2 * partitions; ++n) {
+            move(true);
+        }
+        begin(true);
+        write(last + block(), size() - block(), 0.3f);  // the far end as well
+        write(0, 3, 0.1f);
+        run(true);
+        move(true);
+    }
+    ASSERT_GT(largest, 0.0);
+    EXPECT_LT(worst / largest, 1e-6);
+    if (block() >= Continuation::samples) {
+        EXPECT_GT(continuedBlocks, crossfades / 3) << "else this compares nothing";
+    } else {
+        EXPECT_EQ(continuedBlocks, 0);
     }
 }
 
@@ -290,7 +355,9 @@ INSTANTIATE_TEST_SUITE_P(Shapes,
                          testing::Values(Shape{32, 1},
                                          Shape{32, 2},
                                          Shape{16, 5},
+                                         Shape{64, 1},
                                          Shape{64, 3},
+                                         Shape{128, 8},
                                          Shape{32, 17},
                                          Shape{32, 48, 4},
                                          Shape{16, 90, 8},

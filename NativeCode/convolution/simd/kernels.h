@@ -78,13 +78,16 @@ struct Kernels {
     /// As `window`, of M reals that M zeros follow; the zeros are not read.
     void (*partition)(const BlockTables& tables, const float* input, ComplexBin* bins);
     /// From a block spectrum samples M to M + `samples` - 1 of the window, 2M times, for up to M
-    /// `samples`. `output` holds M floats; those behind the samples are left undefined. No array
-    /// may overlap another.
+    /// `samples`. `output` holds M floats; those behind the samples are left undefined. Likewise
+    /// samples 0 to `wrappedSamples` - 1 in `wrapped`, M floats at most, rounded up to whole
+    /// vectors of `lanes`; null for none. No array may overlap another.
     void (*block)(const BlockTables& tables,
                   const ComplexBin* bins,
                   float* output,
                   float* work,
-                  std::size_t samples);
+                  std::size_t samples,
+                  float* wrapped,
+                  std::size_t wrappedSamples);
     /// sumL = baseL + input[0] * left[0] + input[1] * left[1] + ..., `count` products of `bins`
     /// bins of block spectra made with `lanes` lanes, and sumR with baseR and right. `bins` is a
     /// multiple of `lanes`. A null base is zero; a base may be its sum. Without a product nothing

@@ -283,14 +283,19 @@ struct RowSink {
     }
 };
 
-/// The second half of the samples; the first one is not made. Twice the value: a window and its
-/// spectrum count 2M.
+/// The second half of the samples, and some rows of the first, the wrapped one. Twice the value: a
+/// window and its spectrum count 2M.
 template <class Lanes>
 struct BlockSink {
     float* samples;
+    float* wrapped;
+    Index wrappedRows;
 
     TESSALY_KERNEL_INLINE void first(Index row, const Complex<Lanes>& value) const {
         Lanes::store(samples + Lanes::count * row, Lanes::add(value.re, value.re));
+        if (row < wrappedRows) {
+            Lanes::store(wrapped + Lanes::count * row, Lanes::add(value.im, value.im));
+        }
     }
     TESSALY_KERNEL_INLINE void other(Index row,
                                      const Complex<Lanes>& value,
@@ -298,6 +303,11 @@ struct BlockSink {
         const auto re =
             Lanes::multiplySubtract(value.re, root.re, Lanes::multiply(value.im, root.im));
         Lanes::store(samples + Lanes::count * row, Lanes::add(re, re));
+        if (row < wrappedRows) {
+            const auto im =
+                Lanes::multiplyAdd(value.re, root.im, Lanes::multiply(value.im, root.re));
+            Lanes::store(wrapped + Lanes::count * row, Lanes::add(im, im));
+        }
     }
 };
 
@@ -362,12 +372,12 @@ TESSALY_KERNEL_INLINE void joinBy(const RingPasses::Pass& pass,
 /// All passes down the rows, in place but for the last one. `wanted` rows of the result are made at
 /// least.
 template <class Lanes>
-void joinAll(const BlockTables& tables, float* rows, float* samples, Index wanted) {
+void joinAll(const BlockTables& tables, float* rows, const BlockSink<Lanes>& result, Index wanted) {
     const RingPasses all(tables);
     for (int k = all.count - 1; k > 0; --k) {
         joinBy<Lanes>(all.passes[k], rows, RowSink<Lanes>{rows}, wanted);
     }
-    joinBy<Lanes>(all.passes[0], rows, BlockSink<Lanes>{samples}, wanted);
+    joinBy<Lanes>(all.passes[0], rows, result, wanted);
 }
 
 template <class Lanes>
@@ -391,8 +401,13 @@ void blockLanes(const BlockTables& tables,
                 const ComplexBin* bins,
                 float* output,
                 float* work,
-                std::size_t samples) {
+                std::size_t samples,
+                float* wrapped,
+                std::size_t wrappedSamples) {
     constexpr Index count = Lanes::count;
+    const auto rowsOf = [](std::size_t wanted) {
+        return (static_cast<Index>(wanted) + count - 1) / count;
+    };
     if constexpr (count > 1) {
         joinAcross<Lanes>(tables, floats(bins), work);
     } else {
@@ -400,7 +415,9 @@ void blockLanes(const BlockTables& tables,
             storeGroup(work, k, Complex<Lanes>{bins[k].im, bins[k].re});
         }
     }
-    joinAll<Lanes>(tables, work, output, (static_cast<Index>(samples) + count - 1) / count);
+    const BlockSink<Lanes> result{output, wrapped, rowsOf(wrappedSamples)};
+    joinAll<Lanes>(tables, work, result,
+                   rowsOf(samples > wrappedSamples ? samples : wrappedSamples));
 }
 
 // ---- Sums of products of such spectra ----

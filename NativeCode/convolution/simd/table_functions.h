@@ -47,9 +47,12 @@ struct TransformsOver {
                       const ComplexBin* bins,
                       float* output,
                       float* work,
-                      std::size_t samples) {
-        with(tables.lanes,
-             [&]<class Lanes>() { blockLanes<Lanes>(tables, bins, output, work, samples); });
+                      std::size_t samples,
+                      float* wrapped,
+                      std::size_t wrappedSamples) {
+        with(tables.lanes, [&]<class Lanes>() {
+            blockLanes<Lanes>(tables, bins, output, work, samples, wrapped, wrappedSamples);
+        });
     }
     static void sumOfProducts(std::int32_t lanes,
                               std::size_t bins,
