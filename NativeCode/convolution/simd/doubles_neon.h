@@ -42,6 +42,7 @@ struct AheadNeon {
     static constexpr int ahead = 4;
 
     static Vector load(const double* p) { return vld1q_f64(p); }
+    static Vector broadcast(const double* p) { return vld1q_dup_f64(p); }
     static void store(double* p, Vector a) { vst1q_f64(p, a); }
     static Vector add(Vector a, Vector b) { return vaddq_f64(a, b); }
     static Vector multiply(Vector a, Vector b) { return vmulq_f64(a, b); }

@@ -52,6 +52,7 @@ struct AheadLanes2 {
     static constexpr int ahead = 4;
 
     static Vector load(const double* p) { return _mm_loadu_pd(p); }
+    static Vector broadcast(const double* p) { return _mm_set1_pd(*p); }
     static void store(double* p, Vector a) { _mm_storeu_pd(p, a); }
     static Vector add(Vector a, Vector b) { return _mm_add_pd(a, b); }
     static Vector multiply(Vector a, Vector b) { return _mm_mul_pd(a, b); }
@@ -110,6 +111,7 @@ struct AheadLanes4 {
     static constexpr int ahead = 8;
 
     static Vector load(const double* p) { return _mm256_loadu_pd(p); }
+    static Vector broadcast(const double* p) { return _mm256_broadcast_sd(p); }
     static void store(double* p, Vector a) { _mm256_storeu_pd(p, a); }
     static Vector add(Vector a, Vector b) { return _mm256_add_pd(a, b); }
     static Vector multiply(Vector a, Vector b) { return _mm256_mul_pd(a, b); }
@@ -134,6 +136,7 @@ struct AheadLanes8 {
     static constexpr int ahead = 8;
 
     static Vector load(const double* p) { return _mm512_loadu_pd(p); }
+    static Vector broadcast(const double* p) { return _mm512_set1_pd(*p); }
     static void store(double* p, Vector a) { _mm512_storeu_pd(p, a); }
     static Vector add(Vector a, Vector b) { return _mm512_add_pd(a, b); }
     static Vector multiply(Vector a, Vector b) { return _mm512_mul_pd(a, b); }

@@ -6,8 +6,8 @@
 //   loadPair / storePair (a pair of singles of each piece), loadTwoPairs / storeTwoPairs,
 // and one for look-ahead, if looksAhead,
 //   Vector (of `lanes` doubles), ahead (samples, a multiple of them), load, store, add, multiply,
-//   multiplyAdd(a, b, c) = a b + c, lane<i> (in all lanes), fromSingles, toSingles, rounded (to
-//   single and back).
+//   multiplyAdd(a, b, c) = a b + c, lane<i> and broadcast (one value, of a vector or in memory, in
+//   all lanes), fromSingles, toSingles, rounded (to single and back).
 #pragma once
 
 #include "convolution/simd/complex_lanes.h"
@@ -150,9 +150,8 @@ struct SectionNumbers {};
 /// samples.
 template <int Ahead>
 struct LookAhead {
-    /// The outputs from an input of 1, h[0] to h[Ahead - 1], behind zeros: from input i those that
-    /// begin i places earlier.
-    double fromInputs[2 * Ahead];
+    /// The outputs from an input of 1, in each of its places: zeros in front of it.
+    alignas(64) double fromInputs[Ahead][Ahead] = {};
     double fromLastInput[Ahead];
     double fromInputBefore[Ahead];
     double fromLastOutput[Ahead];
@@ -168,8 +167,9 @@ struct LookAhead {
         for (int n = 0; n < Ahead; ++n) {
             const double p = first.first;
             const double q = second.first;
-            fromInputs[n] = 0.0;
-            fromInputs[Ahead + n] = last;
+            for (int i = 0; i + n < Ahead; ++i) {
+                fromInputs[i][i + n] = last;
+            }
             fromLastInput[n] = c.b1 * p + c.b2 * q;
             fromInputBefore[n] = c.b2 * p;
             fromLastOutput[n] = -(c.a1 * p + c.a2 * q);
@@ -183,7 +183,8 @@ struct LookAhead {
     }
 };
 
-/// One section of several in series, `Ahead` samples at a time.
+/// One section of several in series, some samples at a time. Its sums over the inputs are kept
+/// apart, so that this stays in registers.
 template <class Lanes>
 class AheadSection {
 public:
@@ -192,16 +193,20 @@ public:
     static constexpr int lanes = Lanes::lanes;
     static constexpr int vectors = ahead / lanes;
 
-    TESSALY_KERNEL_INLINE explicit AheadSection(const RunningSection& section) : from_(section) {
+    using From = LookAhead<ahead>;
+
+    TESSALY_KERNEL_INLINE explicit AheadSection(const From& from) {
         TESSALY_KERNEL_UNROLL
         for (int v = 0; v < vectors; ++v) {
-            carry_[v] = Lanes::load(from_.fromState + v * lanes);
+            carry_[v] = Lanes::load(from.fromState + v * lanes);
         }
+        const double none = 0.0;
+        lastInput_ = inputBefore_ = lastOutput_ = outputBefore_ = Lanes::broadcast(&none);
     }
 
     /// Outputs of as many inputs.
-    TESSALY_KERNEL_INLINE void step(const Vector (&x)[vectors], Vector (&y)[vectors]) {
-        addInputs<0>(x, y);
+    TESSALY_KERNEL_INLINE void step(const From& from, const double* x, Vector (&y)[vectors]) {
+        addInputs<0>(from, x, y);
         TESSALY_KERNEL_UNROLL
         for (int v = 0; v < vectors; ++v) {
             y[v] = Lanes::add(y[v], carry_[v]);  // last of all, since this one waits
@@ -211,11 +216,11 @@ public:
         TESSALY_KERNEL_UNROLL
         for (int v = 0; v < vectors; ++v) {
             const Vector fromInputs = Lanes::multiplyAdd(
-                Lanes::load(from_.fromLastInput + v * lanes), lastInput_,
-                Lanes::multiply(Lanes::load(from_.fromInputBefore + v * lanes), inputBefore_));
+                Lanes::load(from.fromLastInput + v * lanes), lastInput_,
+                Lanes::multiply(Lanes::load(from.fromInputBefore + v * lanes), inputBefore_));
             carry_[v] = Lanes::multiplyAdd(
-                Lanes::load(from_.fromLastOutput + v * lanes), lastOutput_,
-                Lanes::multiplyAdd(Lanes::load(from_.fromOutputBefore + v * lanes), outputBefore_,
+                Lanes::load(from.fromLastOutput + v * lanes), lastOutput_,
+                Lanes::multiplyAdd(Lanes::load(from.fromOutputBefore + v * lanes), outputBefore_,
                                    fromInputs));
         }
     }
@@ -236,18 +241,20 @@ public:
 private:
     /// Inputs `First` and the one behind it, in sums of their own, and all that follow.
     template <int First>
-    TESSALY_KERNEL_INLINE void addInputs(const Vector (&x)[vectors], Vector (&sum)[vectors]) {
-        const Vector even = Lanes::template lane<First % lanes>(x[First / lanes]);
-        const Vector odd = Lanes::template lane<First % lanes + 1>(x[First / lanes]);
+    TESSALY_KERNEL_INLINE void addInputs(const From& from,
+                                         const double* x,
+                                         Vector (&sum)[vectors]) {
+        const Vector even = Lanes::broadcast(x + First);
+        const Vector odd = Lanes::broadcast(x + First + 1);
         Vector part[vectors];
         TESSALY_KERNEL_UNROLL
         for (int v = First / lanes; v < vectors; ++v) {
-            const double* const outputs = from_.fromInputs + ahead + v * lanes - First;
-            part[v] = Lanes::multiply(Lanes::load(outputs), even);
-            part[v] = Lanes::multiplyAdd(Lanes::load(outputs - 1), odd, part[v]);
+            part[v] = Lanes::multiply(Lanes::load(from.fromInputs[First] + v * lanes), even);
+            part[v] = Lanes::multiplyAdd(Lanes::load(from.fromInputs[First + 1] + v * lanes), odd,
+                                         part[v]);
         }
         if constexpr (First + 2 < ahead) {
-            addInputs<First + 2>(x, sum);
+            addInputs<First + 2>(from, x, sum);
         } else {
             lastInput_ = odd;
             inputBefore_ = even;
@@ -259,7 +266,6 @@ private:
         }
     }
 
-    LookAhead<ahead> from_;
     Vector carry_[vectors];
     // In all lanes.
     Vector lastInput_;
@@ -268,62 +274,78 @@ private:
     Vector outputBefore_;
 };
 
-/// Section `Number` takes the step that it is at when the first one is at `step`: each works one
-/// behind the one before it, so that none waits for another.
-/// @param waiting  what the section before each one left
-template <int Number, class Lanes, int Sections, int Vectors>
-TESSALY_KERNEL_INLINE void advanceSection(AheadSection<Lanes> (&running)[Sections],
-                                          typename Lanes::Vector (&waiting)[Sections][Vectors],
+/// Between two sections in series samples wait in memory, as doubles: there each is read into all
+/// lanes for nothing, which from a register takes a shuffle. A store is read in parts only when it
+/// has left the core, some steps later.
+constexpr std::size_t stepsBetween = 4;
+constexpr std::size_t stepsKept = 8;  // a power of two above
+template <class Lanes>
+struct WaitingSamples {
+    alignas(64) double steps[stepsKept][Lanes::ahead];
+
+    TESSALY_KERNEL_INLINE double* at(std::size_t step) { return steps[step % stepsKept]; }
+};
+
+/// The `Number`th of the sections takes the step that it is at when the first samples are read at
+/// `step`.
+template <int Number, class Lanes, int Sections>
+TESSALY_KERNEL_INLINE void advanceSection(const LookAhead<Lanes::ahead> (&from)[Sections],
+                                          AheadSection<Lanes> (&running)[Sections],
+                                          WaitingSamples<Lanes> (&waiting)[Sections],
                                           float* samples,
                                           std::size_t step) {
-    constexpr int lanes = Lanes::lanes;
-    float* const at = samples + Lanes::ahead * (step - Number);
-    if constexpr (Number == 0) {
-        TESSALY_KERNEL_UNROLL
-        for (int v = 0; v < Vectors; ++v) {
-            waiting[0][v] = Lanes::fromSingles(at + v * lanes);
-        }
-    }
-    typename Lanes::Vector y[Vectors];
-    running[Number].step(waiting[Number], y);
+    constexpr int vectors = AheadSection<Lanes>::vectors;
+    const std::size_t mine = step - stepsBetween * (Number + 1);
+    typename Lanes::Vector y[vectors];
+    running[Number].step(from[Number], waiting[Number].at(mine), y);
     TESSALY_KERNEL_UNROLL
-    for (int v = 0; v < Vectors; ++v) {
+    for (int v = 0; v < vectors; ++v) {
         if constexpr (Number + 1 < Sections) {
-            waiting[Number + 1][v] = Lanes::rounded(y[v]);
+            Lanes::store(waiting[Number + 1].at(mine) + v * Lanes::lanes, Lanes::rounded(y[v]));
         } else {
-            Lanes::toSingles(at + v * lanes, y[v]);
+            Lanes::toSingles(samples + Lanes::ahead * mine + v * Lanes::lanes, y[v]);
         }
     }
 }
 
-/// @param count  a multiple of Lanes::ahead, and at least as many steps as there are sections
+template <class Lanes>
+TESSALY_KERNEL_INLINE void readSamples(WaitingSamples<Lanes>& waiting,
+                                       const float* samples,
+                                       std::size_t step) {
+    TESSALY_KERNEL_UNROLL
+    for (int n = 0; n < Lanes::ahead; n += Lanes::lanes) {
+        Lanes::store(waiting.at(step) + n, Lanes::fromSingles(samples + Lanes::ahead * step + n));
+    }
+}
+
+/// @param count  a multiple of Lanes::ahead
 template <class Lanes, int... Section>
 void filterSeriesAhead(std::size_t count,
                        float* samples,
                        RunningSection* series,
                        SectionNumbers<Section...>) {
     constexpr int sections = sizeof...(Section);
-    AheadSection<Lanes> running[sections] = {AheadSection<Lanes>(series[Section])...};
-    typename Lanes::Vector waiting[sections][AheadSection<Lanes>::vectors]{};
+    const LookAhead<Lanes::ahead> from[sections] = {LookAhead<Lanes::ahead>(series[Section])...};
+    AheadSection<Lanes> running[sections] = {AheadSection<Lanes>(from[Section])...};
+    WaitingSamples<Lanes> waiting[sections];
     const std::size_t steps = count / Lanes::ahead;
-    const auto begun = [](std::size_t step, int s) { return step >= static_cast<std::size_t>(s); };
-    std::size_t step = 0;
-    // The last section first: each takes what the one before it left in the step before.
-    for (; step + 1 < sections; ++step) {
-        ((begun(step, sections - 1 - Section)
-              ? advanceSection<sections - 1 - Section>(running, waiting, samples, step)
-              : void()),
+    constexpr std::size_t behind = stepsBetween * sections;  // the last section behind the samples
+    // Sections in any order: none takes what another one leaves in the same step.
+    for (std::size_t step = 0; step < steps + behind; ++step) {
+        if (step >= behind && step < steps) {
+            (advanceSection<Section>(from, running, waiting, samples, step), ...);
+            readSamples(waiting[0], samples, step);
+            continue;
+        }
+        const auto works = [&](std::size_t number) {
+            return step >= stepsBetween * number && step < steps + stepsBetween * number;
+        };
+        ((works(Section + 1) ? advanceSection<Section>(from, running, waiting, samples, step)
+                             : void()),
          ...);
-    }
-    for (; step < steps; ++step) {
-        (advanceSection<sections - 1 - Section>(running, waiting, samples, step), ...);
-    }
-    for (; step + 1 < steps + sections; ++step) {
-        ((begun(steps + static_cast<std::size_t>(sections - 1 - Section),
-                static_cast<int>(step) + 1)
-              ? advanceSection<sections - 1 - Section>(running, waiting, samples, step)
-              : void()),
-         ...);
+        if (works(0)) {
+            readSamples(waiting[0], samples, step);
+        }
     }
     (running[Section].storeState(series[Section]), ...);
 }
@@ -335,7 +357,7 @@ void filterSeriesOf(std::size_t count,
                     SectionNumbers<Section...> numbers) {
     std::size_t done = 0;
     if constexpr (Lanes::looksAhead) {
-        // As many steps as there are sections at least, and worth the sums.
+        // Worth the sums.
         constexpr std::size_t fewest = 4 * Lanes::ahead;
         if (count >= fewest) {
             done = count / Lanes::ahead * Lanes::ahead;
