@@ -2,7 +2,7 @@
 #include "convolution/continuation.h"
 
 #include <algorithm>
-#include <cstring>
+#include <array>
 
 #include "base/silence.h"
 #include "convolution/simd/kernels.h"
@@ -14,24 +14,15 @@ void Continuation::prepare(const Kernels& kernels,
                            std::size_t partitions) {
     kernels_ = &kernels;
     blockLength_ = static_cast<std::size_t>(blockLength);
-    if (createBlockTransform(transform_, 2 * samples) != transformOk) {
+    if (partitions > mostPartitions ||
+        createBlockTransform(transform_, 2 * samples) != transformOk) {
         return;
     }
     lanes_ = kernels.transformLanes(samples);
     taps_ = AlignedArray<ComplexBin>(ears * partitions * samples);
     silent_.assign(partitions, 1);
-    starts_ = AlignedArray<ComplexBin>(partitions * samples);
-    start_ = AlignedArray<float>(2 * samples);
-    block_ = AlignedArray<float>(blockLength_);
-    for (AlignedArray<float>& ear : wrapped_) {
-        ear = AlignedArray<float>(samples);
-    }
-    sums_ = AlignedArray<ComplexBin>(ears * samples);
-    result_ = AlignedArray<float>(samples);
-    inputs_.resize(partitions);
-    for (auto& ear : responses_) {
-        ear.resize(partitions);
-    }
+    inputs_ = AlignedArray<ComplexBin>(partitions * samples);
+    starts_ = AlignedArray<float>((ears + 1) * samples);
     partitions_ = partitions;
 }
 
@@ -47,33 +38,33 @@ void Continuation::takeTaps(std::size_t partition, const float* left, const floa
     }
 }
 
-void Continuation::takeWindow(const float* window) noexcept {
-    if (!prepared()) {
-        return;
-    }
-    const bool follows =
-        !broken_ && std::memcmp(window, block_.data(), blockLength_ * sizeof(float)) == 0;
+void Continuation::link(bool follows) noexcept {
+    linked_ = follows && !broken_ ? std::min(linked_ + 1, partitions_) : 0;
     broken_ = false;
-    linked_ = follows ? std::min(linked_ + 1, partitions_) : 0;
-    const float* const newer = window + blockLength_;
-    float* const start = start_.data() + samples;
-    for (std::size_t i = 0; i < samples; ++i) {
-        start[i] = newer[i] + older_[i];
-    }
-    std::copy_n(window, samples, older_.begin());
-    std::copy_n(newer, blockLength_, block_.data());
     newest_ = (newest_ + 1) % partitions_;
-    computeWindow(transform_, start_.data(), starts_.data() + newest_ * samples);
 }
 
-void Continuation::takeSilence() noexcept {
+void Continuation::takeWindow(const float* window, bool follows) noexcept {
     if (!prepared()) {
         return;
     }
-    linked_ = broken_ ? 0 : std::min(linked_ + 1, partitions_);
-    broken_ = false;
-    newest_ = (newest_ + 1) % partitions_;
-    std::fill_n(starts_.data() + newest_ * samples, samples, ComplexBin{});
+    link(follows);
+    alignas(AlignedArray<float>::alignment) std::array<float, 2 * samples> both{};
+    const float* const newer = window + blockLength_;
+    float* const older = olderStart();
+    for (std::size_t i = 0; i < samples; ++i) {
+        both[samples + i] = newer[i] + older[i];
+    }
+    std::copy_n(window, samples, older);
+    computeWindow(transform_, both.data(), inputs_.data() + newest_ * samples);
+}
+
+void Continuation::takeSilence(bool follows) noexcept {
+    if (!prepared()) {
+        return;
+    }
+    link(follows);
+    std::fill_n(inputs_.data() + newest_ * samples, samples, ComplexBin{});
 }
 
 void Continuation::forget() noexcept {
@@ -85,31 +76,30 @@ void Continuation::forget() noexcept {
 void Continuation::keep(std::size_t partitions) noexcept {
     // Zero times what is no number is no number.
     float check = 0.0f;
-    for (const AlignedArray<float>& ear : wrapped_) {
-        for (const float sample : ear) {
-            check += 0.0f * sample;
-        }
+    for (std::size_t i = 0; prepared() && i < ears * samples; ++i) {
+        check += 0.0f * starts_[i];
     }
     kept_ = check == 0.0f && partitions <= partitions_ ? partitions : 0;
 }
 
 /// The short convolutions of some partitions. @return whether there is anything
-bool Continuation::sum(std::size_t begin, std::size_t end, bool add) noexcept {
+bool Continuation::sum(std::size_t begin, std::size_t end, bool add, ComplexBin* sums) noexcept {
+    std::array<const ComplexBin*, mostPartitions> inputs;
+    std::array<const ComplexBin*, mostPartitions> left;
+    std::array<const ComplexBin*, mostPartitions> right;
     std::size_t count = 0;
     for (std::size_t k = begin; k < end; ++k) {
         if (silent_[k] == 0) {
             const std::size_t slot = (newest_ + partitions_ - k) % partitions_;
-            inputs_[count] = starts_.data() + slot * samples;
-            responses_[0][count] = tapsOf(k, 0);
-            responses_[1][count] = tapsOf(k, 1);
+            inputs[count] = inputs_.data() + slot * samples;
+            left[count] = tapsOf(k, 0);
+            right[count] = tapsOf(k, 1);
             ++count;
         }
     }
-    ComplexBin* const left = sums_.data();
-    ComplexBin* const right = left + samples;
-    kernels_->sumOfProducts(lanes_, samples, count, inputs_.data(), responses_[0].data(),
-                            responses_[1].data(), add ? left : nullptr, add ? right : nullptr, left,
-                            right);
+    kernels_->sumOfProducts(lanes_, samples, count, inputs.data(), left.data(), right.data(),
+                            add ? sums : nullptr, add ? sums + samples : nullptr, sums,
+                            sums + samples);
     return count > 0 || add;
 }
 
@@ -117,26 +107,29 @@ void Continuation::addTo(
     float* left, float* right, std::size_t scaledBegin, float gain, std::int32_t count) noexcept {
     const auto wanted = static_cast<std::size_t>(std::clamp(count, 0, samples));
     const std::size_t begin = std::min(scaledBegin, kept_);
-    bool some = sum(begin, kept_, false);
+    alignas(AlignedArray<float>::alignment) std::array<ComplexBin, ears * samples> sums;
+    alignas(AlignedArray<float>::alignment) std::array<float, samples> result;
+    bool some = sum(begin, kept_, false, sums.data());
     if (some && gain != 1.0f) {
-        float* const both = &sums_[0].re;
-        for (std::size_t i = 0; i < 2 * ears * samples; ++i) {
-            both[i] *= gain;
+        for (ComplexBin& bin : sums) {
+            bin.re *= gain;
+            bin.im *= gain;
         }
     }
-    some = sum(0, begin, some);
+    some = sum(0, begin, some, sums.data());
     const float factor =
         static_cast<float>(blockLength_) / static_cast<float>(samples);  // of both transforms
     std::size_t ear = 0;
     for (float* const output : {left, right}) {
+        const float* const wrapped = wrappedOf(ear);
         if (some) {
-            computeBlock(transform_, sums_.data() + ear * samples, result_.data(), samples);
+            computeBlock(transform_, sums.data() + ear * samples, result.data(), samples);
             for (std::size_t i = 0; i < wanted; ++i) {
-                output[i] += factor * result_[i];
+                output[i] += factor * result[i];
             }
         }
         for (std::size_t i = 0; i < wanted; ++i) {
-            output[i] -= wrapped_[ear][i];
+            output[i] -= wrapped[i];
         }
         ++ear;
     }

@@ -1,7 +1,6 @@
 // What a block's result goes on to be in the first samples of the next one.
 #pragma once
 
-#include <array>
 #include <cstddef>
 #include <cstdint>
 #include <vector>
@@ -31,10 +30,12 @@ public:
     /// Samples that can be told.
     static constexpr std::int32_t samples = 64;
     static constexpr std::size_t ears = 2;
+    static constexpr std::size_t mostPartitions = 48;
 
     /// Load time: allocates. Without memory for a transform nothing is prepared.
     /// @param blockLength  B, at least `samples`
-    /// @param partitions   the first ones of a response that results are made of, at least 1
+    /// @param partitions   the first ones of a response that results are made of, 1 to
+    ///                     `mostPartitions`
     /// @throws std::bad_alloc
     void prepare(const Kernels& kernels, std::int32_t blockLength, std::size_t partitions);
     bool prepared() const noexcept { return partitions_ > 0; }
@@ -43,15 +44,16 @@ public:
     /// are not looked at. Block time.
     void takeTaps(std::size_t partition, const float* left, const float* right) noexcept;
     /// The window of 2B samples that a block is made from, once a block. Block time.
-    void takeWindow(const float* window) noexcept;
+    /// @param follows  its first half is the second half of the one taken before
+    void takeWindow(const float* window, bool follows) noexcept;
     /// As `takeWindow` of zeros, after two windows of zeros. Block time.
-    void takeSilence() noexcept;
-    /// The next window does not follow the last one. Block time.
+    void takeSilence(bool follows) noexcept;
+    /// No result stands, and the next window does not follow. Block time.
     void forget() noexcept;
 
     /// What of the result of the block at hand is to be made as well, for `keep`.
     WrappedSamples wrapped(std::size_t ear) noexcept {
-        return {wrapped_[ear].data(), prepared() ? samples : 0};
+        return {prepared() ? wrappedOf(ear) : nullptr, samples};
     }
     /// The wrapped samples stand, of a result that the first `partitions` made with the taps that
     /// were taken. Samples that are no numbers do not. Block time.
@@ -76,29 +78,25 @@ private:
     ComplexBin* tapsOf(std::size_t partition, std::size_t ear) noexcept {
         return taps_.data() + (ears * partition + ear) * samples;
     }
-    bool sum(std::size_t begin, std::size_t end, bool add) noexcept;
+    float* wrappedOf(std::size_t ear) noexcept { return starts_.data() + ear * samples; }
+    /// Start of the older half of the newest window.
+    float* olderStart() noexcept { return starts_.data() + ears * samples; }
+    void link(bool follows) noexcept;
+    bool sum(std::size_t begin, std::size_t end, bool add, ComplexBin* sums) noexcept;
 
     const Kernels* kernels_ = nullptr;
     std::size_t blockLength_ = 0;
     std::size_t partitions_ = 0;
-    TransformHandle transform_;           ///< of 2 `samples`
-    std::int32_t lanes_ = 1;              ///< of its spectra
-    AlignedArray<ComplexBin> taps_;       ///< per partition and ear
-    std::vector<std::uint8_t> silent_;    ///< per partition: both ears' taps are zeros
-    AlignedArray<ComplexBin> starts_;     ///< x2 + x0 of each block, in a ring of `partitions_`
-    std::size_t newest_ = 0;              ///< place in that ring
-    AlignedArray<float> start_;           ///< `samples` zeros, and x2 + x0 of the newest block
-    AlignedArray<float> block_;           ///< the newest B samples
-    std::array<float, samples> older_{};  ///< start of the B samples before them
-    std::size_t linked_ = 0;              ///< newest windows that each began as the last ended
-    bool broken_ = true;                  ///< the next one does not
-    std::array<AlignedArray<float>, ears> wrapped_;
+    TransformHandle transform_;         ///< of 2 `samples`
+    std::int32_t lanes_ = 1;            ///< of its spectra
+    AlignedArray<ComplexBin> taps_;     ///< per partition and ear
+    std::vector<std::uint8_t> silent_;  ///< per partition: both ears' taps are zeros
+    AlignedArray<ComplexBin> inputs_;   ///< x2 + x0 of each block, in a ring of `partitions_`
+    std::size_t newest_ = 0;            ///< place in that ring
+    AlignedArray<float> starts_;        ///< `wrappedOf` both ears and `olderStart`
+    std::size_t linked_ = 0;            ///< newest windows that each followed the one before
+    bool broken_ = true;                ///< the next one does not
     std::size_t kept_ = 0;
-    // Of `addTo`:
-    AlignedArray<ComplexBin> sums_;  ///< both ears
-    AlignedArray<float> result_;
-    std::vector<const ComplexBin*> inputs_;
-    std::array<std::vector<const ComplexBin*>, ears> responses_;
 };
 
 }  // namespace tessaly

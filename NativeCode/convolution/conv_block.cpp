@@ -29,8 +29,7 @@ void convClass::rest(convClass* taker) noexcept {
     convClass& owner = taker != nullptr ? *taker : *this;
     owner.ring_.set(owner.newestSlot(), true, blockNumber());
     if (taker != nullptr) {
-        followRing(*taker);
-        continuation_.takeSilence();
+        continuation_.takeSilence(followRing(*taker));
     } else {
         continuation_.forget();
     }

@@ -213,8 +213,10 @@ convClass::~convClass() {
         freeSpectrum(partsMemoryL_);
         freeSpectrum(partsMemoryR_);
     }
-    freeSpectrum(accumL);
-    freeSpectrum(accumR);
+    if (passing_ == nullptr) {
+        freeSpectrum(accumL);
+        freeSpectrum(accumR);
+    }
     freeSpectrum(end_.left);
     freeSpectrum(end_.right);
 }
@@ -260,19 +262,25 @@ void convClass::splitFarTail(std::int32_t ratio) {
     }
 }
 
-void convClass::continueResults(bool told) {
+void convClass::continueResults() {
     const std::size_t partitions = far_ != nullptr ? far_->firstPartition() : filterPartsL.size();
     if (isSecondInstance != 0 || directFilterFeed != 0 || blockLength < Continuation::samples ||
-        partitions >= static_cast<std::size_t>(FarTail::fewestPartitions)) {
+        partitions > Continuation::mostPartitions || !accumulators().complete()) {
         return;
     }
     try {
-        if (told) {
-            passing_ = findPassingSpectra(2 * passingPairs * stride_);
-            owed_.assign(partitions, 0);
-            changedBefore_.assign(partitions, 0);
-        }
+        owed_.assign(partitions, 0);
+        changedBefore_.assign(partitions, 0);
+        ComplexBin* const shared = findPassingSpectra(2 * (passingPairs + 1) * stride_);
         continuation_.prepare(*kernels_, blockLength, partitions);
+        if (!continuation_.prepared()) {
+            return;
+        }
+        passing_ = shared;
+        freeSpectrum(accumL);
+        freeSpectrum(accumR);
+        accumL = passing_ + std::ptrdiff_t{2} * passingPairs * stride_;
+        accumR = accumL + stride_;
     } catch (const std::bad_alloc&) {
         logTrace("no memory for results that go on, each old response is convolved");
     }

@@ -120,14 +120,14 @@ public:
     /// gives the same: FarTail. Load time: allocates. Without memory all stays uniform.
     void splitFarTail(std::int32_t ratio);
     /// In crossfade blocks one after the other the first samples of the old response come from what
-    /// the last result goes on to be. Behind `splitFarTail`, if that is called. Load time:
-    /// allocates. Without memory, and with many or short blocks, each is convolved.
-    /// @param told  `beforeWriting` is called: partitions that change in each of these blocks need
-    ///              not keep their spectra
-    void continueResults(bool told);
-    /// The responses may be written before the next block. Block time.
-    /// @param crossfade  that block will be made, by `processCrossfade` with the same second
-    ///                   instance, and the input window goes on
+    /// the last result goes on to be, and partitions that change in each of them keep no spectra.
+    /// For whoever calls `beforeWriting`; behind `splitFarTail`, if that is called. Load time:
+    /// allocates, and takes memory that all convolvers share, so that from here on they run one
+    /// after the other. Without memory, and with many or short blocks, all is convolved.
+    void continueResults();
+    /// Once before each block, and before the responses are written for it. Block time.
+    /// @param crossfade  the block will be made, by `processCrossfade` with the same second
+    ///                   instance, and its input window is that of the block before, moved on
     void beforeWriting(bool crossfade) noexcept;
     /// The last block's old response was continued. For tests.
     bool oldContinued() const noexcept { return oldContinued_; }
@@ -258,7 +258,7 @@ private:
     void render(const RingView& ring, const RingView& other, bool goesOn = false) noexcept;
     void renderSilence() noexcept;
     void renderOldByTaps(convClass& second, std::int32_t heard) noexcept;
-    void followRing(const convClass& second) noexcept;
+    bool followRing(const convClass& second) noexcept;
     bool mayContinue() const noexcept;
     bool continuesOld(const RingView& ring,
                       const ScaledPartitions& before,
@@ -272,6 +272,7 @@ private:
     bool addOwed(const RingView& ring, bool summed) noexcept;
     void takePartition(std::size_t partition, ComplexBin* left, ComplexBin* right) noexcept;
     void noteStartChange(std::int32_t taps) noexcept;
+    void findStartChange() noexcept;
     void renderBoth(convClass& second, const ScaledPartitions& before, std::int32_t heard) noexcept;
     std::size_t bins() const noexcept;
     void useNaturalOrder() noexcept;
@@ -323,6 +324,7 @@ private:
     const convClass* followed_ = nullptr;  ///< whose ring its windows came to
     std::uint64_t followedWrites_ = 0;     ///< that the ring had seen then
     std::size_t followedSlot_ = 0;
+    bool windowFollows_ = false;  ///< as promised for the next block
     bool oldContinued_ = false;
 
     /// Per partition: the spectrum is not that of its samples, which stand in the responses and go
@@ -330,7 +332,8 @@ private:
     std::vector<std::uint8_t> owed_;
     std::int32_t owedCount_ = 0;
     static constexpr std::int32_t passingPairs = 2;
-    ComplexBin* passing_ = nullptr;  ///< so many pairs of spectra on their way, `stride_` apart
+    ComplexBin* passing_ = nullptr;  ///< so many pairs of spectra on their way, `stride_` apart;
+                                     ///< one more is `accumL` and `accumR` then
     std::vector<std::uint8_t> changedBefore_;  ///< as `changed_`, in the block before
     bool naturalOrder_ = false;                ///< of all spectra; once so, for good
     AlignedArray<float> padded_;               ///< a partition and B zeros, for natural order

@@ -1,5 +1,6 @@
 // A crossfade block: the same input through the old response and the new one.
 #include <algorithm>
+#include <utility>
 
 #include "convolution/conv_class.h"
 #include "convolution/simd/kernels.h"
@@ -49,9 +50,10 @@ void convClass::processCrossfade(convClass& second, std::int32_t heardOfOld) noe
     second.watchSelection();
     second.resultSilent_ = false;  // its results are written here, past its own knowledge
     const bool silent = second.takeInput(blockNumber());
-    followRing(second);
+    const bool promised = std::exchange(windowFollows_, false);
+    const bool follows = followRing(second) && promised;
     if (second.input != nullptr) {
-        continuation_.takeWindow(second.input);
+        continuation_.takeWindow(second.input, follows);
     }
     watchSelection();
     const bool update = filterChangeAll || forceUpdateAll;
@@ -85,6 +87,7 @@ void convClass::processCrossfade(convClass& second, std::int32_t heardOfOld) noe
     settle();
     const bool byTaps = changedTaps_ > 0 && before == scaled_ && scaled_.begin > 0;
     if (changedCount_ > 0 && byTaps) {
+        findStartChange();
         transformChanged();
         changedCount_ = 0;
     }
@@ -100,19 +103,18 @@ void convClass::processCrossfade(convClass& second, std::int32_t heardOfOld) noe
     renderBoth(second, before, heard);
 }
 
-/// A crossfade block's window has come to the second instance's ring: the next one of the ring that
-/// results go on from, or else a first one.
-void convClass::followRing(const convClass& second) noexcept {
+/// A crossfade block's window has come to the second instance's ring.
+/// @return whether it is the one behind the last that `continuation_` has taken
+bool convClass::followRing(const convClass& second) noexcept {
     const std::size_t slot = newestSlot();
     const std::uint64_t writes = second.ring_.writes();
     const auto slots = static_cast<std::size_t>(FDLtoBUFConv);
-    if (followed_ != &second || writes != followedWrites_ + 1 ||
-        slot != (followedSlot_ + 1) % slots) {
-        continuation_.forget();
-    }
+    const bool follows = followed_ == &second && writes == followedWrites_ + 1 &&
+                         slot == (followedSlot_ + 1) % slots;
     followed_ = &second;
     followedWrites_ = writes;
     followedSlot_ = slot;
+    return follows;
 }
 
 /// From the last result's ring and place a next one may go on.
@@ -122,7 +124,11 @@ bool convClass::mayContinue() const noexcept {
 }
 
 void convClass::beforeWriting(bool crossfade) noexcept {
-    if (!crossfade || !mayContinue()) {
+    windowFollows_ = crossfade;
+    if (!crossfade) {
+        continuation_.forget();
+    }
+    if (!mayContinue()) {
         settle();
     }
 }
@@ -132,11 +138,11 @@ void convClass::chooseOwed() noexcept {
     const std::size_t end = std::min(owed_.size(), layoutOf(scaled_).scaledBegin);
     for (std::size_t i = 0; i < owed_.size(); ++i) {
         const bool owed = i < end && changed_[i] != 0 && changedBefore_[i] != 0;
-        if (owed_[i] != 0 && !owed) {
+        const bool before = std::exchange(owed_[i], owed ? 1 : 0) != 0;
+        owedCount_ += (owed ? 1 : 0) - (before ? 1 : 0);
+        if (before && !owed) {
             takePartition(i, filterPartsL[i], filterPartsR[i]);
         }
-        owedCount_ += (owed ? 1 : 0) - owed_[i];
-        owed_[i] = owed ? 1 : 0;
     }
 }
 

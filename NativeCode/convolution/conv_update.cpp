@@ -101,10 +101,14 @@ void convClass::noteStartChange(std::int32_t taps) noexcept {
         return;
     }
     changedTaps_ = taps;
+}
+
+/// What the start was more than what it is, where only that changed.
+void convClass::findStartChange() noexcept {
     float* const kept = startTaps_.data();
     float* const change = startChange_.data();
     const auto factor = static_cast<float>(fftLength);  // of the unscaled transforms
-    for (std::int32_t k = 0; k < taps; ++k) {
+    for (std::int32_t k = 0; k < changedTaps_; ++k) {
         change[k] = factor * (kept[k] - firL[k]);
         change[directTaps + k] = factor * (kept[directTaps + k] - firR[k]);
     }
@@ -112,11 +116,6 @@ void convClass::noteStartChange(std::int32_t taps) noexcept {
 
 void convClass::transformChanged() noexcept {
     scaled_ = scaledNow();
-    if (!startTaps_.empty() && changed_[0] != 0 && firL != nullptr && firR != nullptr) {
-        const std::int32_t taps = std::min({directTaps, blockLength, firBufferSize});
-        std::copy_n(firL, taps, startTaps_.data());
-        std::copy_n(firR, taps, startTaps_.data() + directTaps);
-    }
     for (std::size_t i = 0; i < changed_.size(); ++i) {
         const bool owed = i < owed_.size() && owed_[i] != 0;
         if (changed_[i] != 0 && !owed) {
@@ -143,6 +142,13 @@ void convClass::takePartition(std::size_t partition, ComplexBin* left, ComplexBi
     const bool rightSilent = take(firR, timePartsR[partition], right);
     if (firL != nullptr && firR != nullptr) {
         continuation_.takeTaps(partition, firL + start, firR + start);
+        // While its spectrum is owed nobody looks for what changed.
+        const bool owed = !owed_.empty() && owed_[0] != 0;
+        if (partition == 0 && !startTaps_.empty() && !owed) {
+            const std::int32_t taps = std::min({directTaps, blockLength, firBufferSize});
+            std::copy_n(firL, taps, startTaps_.data());
+            std::copy_n(firR, taps, startTaps_.data() + directTaps);
+        }
     }
     silent_[partition] = leftSilent && rightSilent && dftiStatus == transformOk ? 1 : 0;
 }

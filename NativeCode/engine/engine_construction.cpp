@@ -258,7 +258,7 @@ bool buildConvolvers(EngineState& state) {
             FarTail::ratioFor(state.sizes.fdlCount, earlyPartitions(state)));
     }
     if (state.switches.fading) {
-        state.firstOLS->continueResults(true);
+        state.firstOLS->continueResults();
         state.secondOLS = makeConvolver(state, "secondOLSfeeded-Instanz", true);
         shareSpectra(state);
     }

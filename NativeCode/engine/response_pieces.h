@@ -1,6 +1,7 @@
 // What the early part of a response is made of: direct sound and reflections, as a list.
 #pragma once
 
+#include <algorithm>
 #include <array>
 #include <cstdint>
 
@@ -40,6 +41,18 @@ struct ResponsePiece {
 class PieceList {
 public:
     static constexpr int capacity = 1 + 2 + Reflections::capacity;
+
+    PieceList() = default;
+    PieceList(const PieceList&) = default;
+    ~PieceList() = default;
+    /// Of a long array the few that are there.
+    PieceList& operator=(const PieceList& other) noexcept {
+        if (this != &other) {
+            std::copy(other.begin(), other.end(), pieces_.begin());
+            count_ = other.count_;
+        }
+        return *this;
+    }
 
     void clear() noexcept { count_ = 0; }
     /// Pieces beyond the capacity, which no engine has, are dropped.

@@ -43,7 +43,7 @@ protected:
         if (GetParam().farRatio > 0) {
             spared.first->splitFarTail(GetParam().farRatio);
         }
-        spared.first->continueResults(true);
+        spared.first->continueResults();
         const int size = static_cast<int>(spared.filterLeft.size());
         spared.first->watch(&notes, size);
         notes.scaledEnd = {size, 1.0f};
@@ -314,6 +314,30 @@ TEST_P(ChangingResponse, OldResponsesOfARunOfMovesGoOnFromTheLastResult) {
     } else {
         EXPECT_EQ(continuedBlocks, 0);
     }
+}
+
+/// An engine that may not convolve moves its window on all the same.
+TEST_P(ChangingResponse, ABlockThatNobodyMadeIsNoBlockToGoOnFrom) {
+    write(0, size(), 0.5f);
+    run(true);
+    const auto move = [&] {
+        begin(true);
+        write(0, block(), 0.5f);
+        run(true);
+    };
+    for (int round = 0; round < 3; ++round) {
+        for (int n = 0; n < GetParam().partitions + 3; ++n) {
+            move();
+        }
+        const std::vector<float> missed = noise.samples(static_cast<std::size_t>(block()));
+        begin(false);
+        write(0, block(), 0.5f);
+        plain.feed(missed);
+        spared.feed(missed);
+    }
+    move();
+    ASSERT_GT(largest, 0.0);
+    EXPECT_LT(worst / largest, 1e-6);
 }
 
 class ChangingFarTail : public ChangingResponse {};
