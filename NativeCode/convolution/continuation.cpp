@@ -30,7 +30,8 @@ void Continuation::takeTaps(std::size_t partition, const float* left, const floa
     if (partition >= partitions_) {
         return;
     }
-    const bool silent = allZero(left, samples) && allZero(right, samples);
+    const bool silent =
+        left == nullptr || right == nullptr || (allZero(left, samples) && allZero(right, samples));
     silent_[partition] = silent ? 1 : 0;
     if (!silent) {
         computePartition(transform_, left, tapsOf(partition, 0));

@@ -40,8 +40,8 @@ public:
     void prepare(const Kernels& kernels, std::int32_t blockLength, std::size_t partitions);
     bool prepared() const noexcept { return partitions_ > 0; }
 
-    /// The first samples of a partition as it counts from now on. Those behind the prepared ones
-    /// are not looked at. Block time.
+    /// The first samples of a partition as it counts from now on; null: they are zeros. Those
+    /// behind the prepared ones are not looked at. Block time.
     void takeTaps(std::size_t partition, const float* left, const float* right) noexcept;
     /// The window of 2B samples that a block is made from, once a block. Block time.
     /// @param follows  its first half is the second half of the one taken before

@@ -69,9 +69,11 @@ std::int32_t convClass::transformWindow(const float* samples, ComplexBin* spectr
                          : windowFFT(samples, spectrum, fftHandle);
 }
 
-std::int32_t convClass::transformPartition(const float* samples, ComplexBin* spectrum) noexcept {
+std::int32_t convClass::transformPartition(const float* samples,
+                                           ComplexBin* spectrum,
+                                           std::uint64_t sounding) noexcept {
     if (!naturalOrder_) {
-        return partitionFFT(samples, spectrum, fftHandle);
+        return partitionFFT(samples, spectrum, fftHandle, sounding);
     }
     std::copy_n(samples, blockLength, padded_.data());
     return FFT(padded_.data(), spectrum, fftHandle);

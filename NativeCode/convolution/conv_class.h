@@ -279,7 +279,9 @@ private:
     void followCompensation() noexcept;
     void reorderResponse() noexcept;
     std::int32_t transformWindow(const float* samples, ComplexBin* spectrum) noexcept;
-    std::int32_t transformPartition(const float* samples, ComplexBin* spectrum) noexcept;
+    std::int32_t transformPartition(const float* samples,
+                                    ComplexBin* spectrum,
+                                    std::uint64_t sounding) noexcept;
     void transformBack(std::int32_t samples, bool alsoWrapped = false) noexcept;
     /// Partitions [0, scaledBegin) of the uniform sums and [scaledBegin, end), which count `gain`
     /// times, as does the far tail behind them.

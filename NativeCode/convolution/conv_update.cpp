@@ -128,6 +128,9 @@ void convClass::transformChanged() noexcept {
 void convClass::takePartition(std::size_t partition, ComplexBin* left, ComplexBin* right) noexcept {
     const auto length = static_cast<std::size_t>(blockLength);
     const std::size_t start = partition * length;
+    const std::uint64_t sounding =
+        notes_ != nullptr ? notes_->soundingParts(static_cast<std::int64_t>(start), blockLength)
+                          : ~std::uint64_t{0};
     const auto take = [&](const float* fir, float* kept, ComplexBin* spectrum) noexcept {
         if (fir == nullptr) {
             return false;
@@ -135,13 +138,19 @@ void convClass::takePartition(std::size_t partition, ComplexBin* left, ComplexBi
         if (kept != nullptr) {
             std::memcpy(kept, fir + start, length * sizeof(float));
         }
-        dftiStatus = transformPartition(fir + start, spectrum);
-        return allZero(fir + start, length);
+        dftiStatus = transformPartition(fir + start, spectrum, sounding);
+        return sounding == 0 || (~sounding == 0 && allZero(fir + start, length));
     };
     const bool leftSilent = take(firL, timePartsL[partition], left);
     const bool rightSilent = take(firR, timePartsR[partition], right);
     if (firL != nullptr && firR != nullptr) {
-        continuation_.takeTaps(partition, firL + start, firR + start);
+        // Its first samples, and no others, are those of the first parts.
+        const std::int64_t parts = std::int64_t{64} * Continuation::samples;
+        const bool begins =
+            (sounding & (~std::uint64_t{0} >>
+                         (64 - std::clamp<std::int64_t>(parts / blockLength, 1, 64)))) != 0;
+        continuation_.takeTaps(partition, begins ? firL + start : nullptr,
+                               begins ? firR + start : nullptr);
         // While its spectrum is owed nobody looks for what changed.
         const bool owed = !owed_.empty() && owed_[0] != 0;
         if (partition == 0 && !startTaps_.empty() && !owed) {

@@ -3,7 +3,9 @@
 
 #include <algorithm>
 #include <array>
+#include <climits>
 #include <cstddef>
+#include <cstdint>
 
 namespace tessaly {
 
@@ -81,8 +83,31 @@ struct ScaledEnd {
 
 /// What a convolver is told about a response beside its samples.
 struct FirNotes {
+    static FirStretches everything() noexcept {
+        FirStretches all;
+        all.include(0, INT_MAX);
+        return all;
+    }
+    /// Parts [k, k + 1) / 64 of samples [begin, begin + length) that may hold something else than
+    /// zeros, at bit k. `length` is at least 1.
+    std::uint64_t soundingParts(std::int64_t begin, std::int64_t length) const noexcept {
+        std::uint64_t parts = 0;
+        for (const FirStretch& stretch : sounding) {
+            const std::int64_t first = std::max<std::int64_t>(stretch.begin - begin, 0);
+            const std::int64_t last = std::min<std::int64_t>(stretch.end - begin, length) - 1;
+            if (first <= last) {
+                const auto from = static_cast<int>(first * 64 / length);
+                const auto to = static_cast<int>(((last + 1) * 64 - 1) / length);
+                parts |= (~std::uint64_t{0} << from) & (~std::uint64_t{0} >> (63 - to));
+            }
+        }
+        return parts;
+    }
+
     FirStretches written;  ///< since the convolver last took them
-    ScaledEnd scaledEnd;   ///< as of now
+    /// Outside of these the response is zeros.
+    FirStretches sounding = everything();
+    ScaledEnd scaledEnd;  ///< as of now
 };
 
 }  // namespace tessaly

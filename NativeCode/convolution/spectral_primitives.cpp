@@ -224,10 +224,11 @@ std::int32_t computeWindow(const TransformHandle& handle,
 
 std::int32_t computePartition(const TransformHandle& handle,
                               const float* input,
-                              ComplexBin* output) noexcept {
+                              ComplexBin* output,
+                              std::uint64_t sounding) noexcept {
     return compute(handle, input, output,
                    ofBlocks([=](const Kernels& kernels, const BlockTables& tables, float*) {
-                       kernels.partition(tables, input, output);
+                       kernels.partition(tables, input, output, sounding);
                    }));
 }
 
@@ -279,8 +280,9 @@ std::int32_t windowFFT(const float* input,
 
 std::int32_t partitionFFT(const float* input,
                           ComplexBin* output,
-                          const TransformHandle& handle) noexcept {
-    return reportForward(computePartition(handle, input, output));
+                          const TransformHandle& handle,
+                          std::uint64_t sounding) noexcept {
+    return reportForward(computePartition(handle, input, output, sounding));
 }
 
 std::int32_t IFFT(const ComplexBin* input, float* output, const TransformHandle& handle) noexcept {

@@ -64,9 +64,12 @@ std::int32_t computeWindow(const TransformHandle& handle,
                            ComplexBin* output) noexcept TESSALY_NONBLOCKING;
 /// As computeWindow, of B reals that B zeros follow, a partition of a response; the zeros are not
 /// read. Block time.
+/// @param sounding  where bit k of 64 is 0, samples k B/64 to (k + 1) B/64 - 1 are zeros, too
 std::int32_t computePartition(const TransformHandle& handle,
                               const float* input,
-                              ComplexBin* output) noexcept TESSALY_NONBLOCKING;
+                              ComplexBin* output,
+                              std::uint64_t sounding = ~std::uint64_t{
+                                  0}) noexcept TESSALY_NONBLOCKING;
 /// The start of the other half of such a result: what the half that is heard gives, continued by B
 /// samples, is taken away there from the product's own start (u^2B = -1).
 struct WrappedSamples {
@@ -97,7 +100,8 @@ std::int32_t windowFFT(const float* input,
                        const TransformHandle& handle) noexcept;
 std::int32_t partitionFFT(const float* input,
                           ComplexBin* output,
-                          const TransformHandle& handle) noexcept;
+                          const TransformHandle& handle,
+                          std::uint64_t sounding = ~std::uint64_t{0}) noexcept;
 /// Backward transform; a refusal is a trace line and leaves `output` as it was. Block time.
 std::int32_t IFFT(const ComplexBin* input, float* output, const TransformHandle& handle) noexcept;
 /// Backward transform of a block spectrum, the first `samples` of its B samples; likewise. Block

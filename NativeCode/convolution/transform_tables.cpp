@@ -119,6 +119,12 @@ std::size_t ringFloats(std::int32_t columns, std::int32_t lanes) {
     return floats;
 }
 
+/// Floats of the first of them, as sums of few rows take it.
+std::size_t firstFloats(std::int32_t columns, std::int32_t lanes) {
+    const auto radix = static_cast<std::size_t>(ringRadix(lanes, columns));
+    return 2 * radix * radix;
+}
+
 /// Floats of the passes across the lanes, four rows at a time.
 std::size_t acrossFloats(std::int32_t points, std::int32_t lanes) {
     if (lanes == 1) {
@@ -132,22 +138,36 @@ std::size_t acrossFloats(std::int32_t points, std::int32_t lanes) {
 class BlockTableStorage {
 public:
     BlockTableStorage(std::int32_t points, std::int32_t lanes)
-        : rings_(ringFloats(points / lanes, lanes)), across_(acrossFloats(points, lanes)) {
+        : rings_(ringFloats(points / lanes, lanes)),
+          first_(firstFloats(points / lanes, lanes)),
+          across_(acrossFloats(points, lanes)) {
         tables_.points = points;
         tables_.lanes = lanes;
         tables_.columns = points / lanes;
         tables_.rings = rings_.data();
+        tables_.first = first_.data();
         tables_.across = across_.data();
+        fillFirst();
         fillRings();
     }
 
     const BlockTables& tables() const { return tables_; }
 
 private:
+    void fillFirst() {
+        const std::int32_t radix = ringRadix(tables_.lanes, tables_.columns);
+        float* out = first_.data();
+        for (std::int32_t power = 0; power < radix; ++power) {
+            for (std::int32_t ring = 0; ring < radix; ++ring) {
+                out = write(out, 1, (wholeTurn + ring) / radix * power);
+            }
+        }
+    }
+
     /// A ring of polynomials with u^n = c is known by the turn of c, as a share of the circle: c =
     /// e^(-2 pi i turn), a fraction whose denominator is a power of two.
     void fillRings() {
-        std::vector<double> turns{0.75};  // u^M = i
+        std::vector<double> turns{wholeTurn};
         float* out = rings_.data();
         const auto splitBy = [&](std::int32_t radix) {
             std::vector<double> split;
@@ -212,7 +232,10 @@ private:
         return out + apart + 1;
     }
 
+    static constexpr double wholeTurn = 0.75;  // u^M = i
+
     AlignedArray<float> rings_;
+    AlignedArray<float> first_;
     AlignedArray<float> across_;
     BlockTables tables_;
 };

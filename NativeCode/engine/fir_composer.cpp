@@ -151,6 +151,7 @@ void FirComposer::forget() noexcept {
     endKnown_ = false;
     postponed_ = false;
     notes.written.include(0, size);
+    notes.sounding = FirNotes::everything();
     notes.scaledEnd = {size, 1.0f};
 }
 
@@ -327,6 +328,11 @@ void FirComposer::writeChanges(CompositionInputs& inputs) noexcept {
     const bool blended = inputs.switches.qvInterpolateFilters;
     const bool measuredTail = hasMeasuredTail(inputs);
     const bool synthetic = hasTail(inputs) && !measuredTail;
+    if (hasTail(inputs) || blended) {
+        notes.sounding = FirNotes::everything();
+    } else {
+        pieces.listFrames(notes.sounding);
+    }
     if (!measuredTail || blended || begin >= ears.size ||
         begin > inputs.tail.startFrames(wanted_.tailCutOff)) {
         const bool sameEnd = !hasTail(inputs) || (sameTail && sameGain && !synthetic);

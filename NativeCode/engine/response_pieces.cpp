@@ -76,6 +76,13 @@ int PieceList::extent() const noexcept {
     return extent;
 }
 
+void PieceList::listFrames(FirStretches& frames) const noexcept {
+    frames.clear();
+    for (const ResponsePiece& piece : *this) {
+        frames.include(piece.position, piece.position + piece.frames);
+    }
+}
+
 bool PieceList::operator==(const PieceList& other) const noexcept {
     return count_ == other.count_ && std::equal(begin(), end(), other.begin());
 }

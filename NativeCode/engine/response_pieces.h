@@ -67,6 +67,9 @@ public:
     /// First frame behind all pieces, 0 without any.
     int extent() const noexcept;
     bool operator==(const PieceList& other) const noexcept;
+    /// Frames that any piece touches, in place of what the list held; some may lie outside of the
+    /// response.
+    void listFrames(FirStretches& frames) const noexcept;
     /// Frames that any piece touches that the other list has not in the same place.
     FirStretches differencesTo(const PieceList& other) const noexcept;
 

@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <bit>
 #include <cmath>
 
 #include "convolution/kernel_fixture.h"
@@ -116,6 +117,51 @@ TEST_P(BlockSpectra, OfAPartitionIsThatOfAWindowWithZerosBehindIt) {
             ASSERT_EQ(got[k].im, expected[k].im) << k;
         }
         EXPECT_EQ(got.back().re, 99.0f) << "wrote behind the spectrum";
+    }
+}
+
+TEST_P(BlockSpectra, OfAPartitionOfFewSamplesNeedOnlyThese) {
+    for (std::size_t length = 2; length <= 8192; length *= 2) {
+        const TransformHandle handle = plan(2 * length);
+        Noise noise(static_cast<std::uint32_t>(length));
+        const std::size_t part = std::max<std::size_t>(length / 64, 1);
+        for (int round = 0; round < 40; ++round) {
+            // From no part to all of them; those that sound lie together, or apart.
+            std::uint64_t sounding = 0;
+            const int count = round < 3 ? round : 2 * round - 14;
+            const int first = static_cast<int>((noise() + 1.0f) * 32.0f) % 64;
+            for (int k = 0; k < count; ++k) {
+                sounding |= std::uint64_t{1} << ((first + (round % 2 == 0 ? k : 11 * k)) % 64);
+            }
+            SCOPED_TRACE(testing::Message() << length << ", parts " << std::hex << sounding);
+            std::vector<float> partition = noise.samples(length);
+            std::vector<float> unread = partition;
+            for (std::size_t i = 0; i < length && length >= 64; ++i) {
+                if ((sounding >> (i / part) & 1) == 0) {
+                    partition[i] = 0.0f;
+                }
+            }
+            // Vectors, of up to 16 samples, that hold something are read.
+            for (std::size_t i = 0; i < length; ++i) {
+                const std::size_t vector = i / 16 * 16;
+                float any = 0.0f;
+                for (std::size_t n = vector; n < std::min(vector + 16, length); ++n) {
+                    any += std::fabs(partition[n]);
+                }
+                const bool read = any > 0.0f || std::popcount(sounding) > 24;
+                unread[i] = length < 64 || read ? partition[i] : 1e30f;
+            }
+            std::vector<ComplexBin> expected(length);
+            std::vector<ComplexBin> got(length + 1, ComplexBin{99.0f, 99.0f});
+            ASSERT_EQ(partitionFFT(partition.data(), expected.data(), handle), transformOk);
+            ASSERT_EQ(partitionFFT(unread.data(), got.data(), handle, sounding), transformOk);
+            for (std::size_t k = 0; k < length; ++k) {
+                const float near = 1e-6f * std::sqrt(static_cast<float>(length));
+                ASSERT_NEAR(got[k].re, expected[k].re, near) << k;
+                ASSERT_NEAR(got[k].im, expected[k].im, near) << k;
+            }
+            EXPECT_EQ(got.back().re, 99.0f) << "wrote behind the spectrum";
+        }
     }
 }
 

@@ -44,6 +44,9 @@ struct BlockTables {
     /// and ring r, r^2 .. r^(R - 1), each as real, imaginary, where r^R = c. The first ring has u^M
     /// = i.
     const float* rings = nullptr;
+    /// Of the first of these passes, for radix R: the powers t = 0 to R - 1 of the roots of each of
+    /// its rings s, behind each other by t, then s, as real, imaginary.
+    const float* first = nullptr;
     /// For four rows at a time: the powers of the rows' roots that the passes across their lanes
     /// take, each as L real parts and then L imaginary parts. Null with one lane.
     const float* across = nullptr;
@@ -75,8 +78,13 @@ struct Kernels {
     /// the table's own; products of them, bin by bin, belong to the products of the polynomials.
     /// The arrays must not overlap.
     void (*window)(const BlockTables& tables, const float* input, ComplexBin* bins);
-    /// As `window`, of M reals that M zeros follow; the zeros are not read.
-    void (*partition)(const BlockTables& tables, const float* input, ComplexBin* bins);
+    /// As `window`, of M reals that M zeros follow; the zeros are not read. `sounding` tells of
+    /// more zeros, which save time where they are many: where bit k of 64 is 0, samples k M/64 to
+    /// (k + 1) M/64 - 1 are zeros. With M below 64 it is not looked at.
+    void (*partition)(const BlockTables& tables,
+                      const float* input,
+                      ComplexBin* bins,
+                      std::uint64_t sounding);
     /// From a block spectrum samples M to M + `samples` - 1 of the window, 2M times, for up to M
     /// `samples`. `output` holds M floats; those behind the samples are left undefined. Likewise
     /// samples 0 to `wrappedSamples` - 1 in `wrapped`, M floats at most, rounded up to whole

@@ -142,15 +142,118 @@ struct RingPasses {
     }
 };
 
+/// All but the first pass.
+template <class Lanes>
+TESSALY_KERNEL_INLINE void splitRest(const RingPasses& all, float* rows) {
+    for (int k = 1; k < all.count; ++k) {
+        const RingPasses::Pass& pass = all.passes[k];
+        splitBy<Lanes>(pass.radix, RowSource<Lanes>{rows}, rows, pass.n, pass.rings, pass.roots);
+    }
+}
+
 template <class Lanes, class Source>
 void splitAll(const BlockTables& tables, const Source& source, float* rows) {
     const RingPasses all(tables);
     const RingPasses::Pass& first = all.passes[0];
     splitBy<Lanes>(first.radix, source, rows, first.n, first.rings, first.roots);
-    for (int k = 1; k < all.count; ++k) {
-        const RingPasses::Pass& pass = all.passes[k];
-        splitBy<Lanes>(pass.radix, RowSource<Lanes>{rows}, rows, pass.n, pass.rings, pass.roots);
+    splitRest<Lanes>(all, rows);
+}
+
+/// Which of the K rows sound, from the 64 parts of all samples. Butterflies of a pass take rows
+/// that lie as far apart as K / R, and so do their bits by 64 / R.
+template <Index Radix>
+class SoundingRows {
+public:
+    static constexpr int apart = 64 / static_cast<int>(Radix);
+
+    SoundingRows(std::uint64_t parts, Index rows) : parts_(parts) {
+        for (; rows < 64; rows *= 2) {
+            // A row is several parts: what any of them holds, at the bit of the first.
+            parts_ |= parts_ >> partsInRow_;
+            partsInRow_ *= 2;
+        }
+        for (; rows > 64; rows /= 2) {
+            ++rowsInPart_;
+        }
     }
+    /// At bit `apart` t: row p + t K / R.
+    std::uint64_t of(Index p) const {
+        constexpr std::uint64_t all =
+            ~std::uint64_t{0} / ((std::uint64_t{1} << (apart - 1)) * 2 - 1);
+        return (parts_ >> ((p * partsInRow_) >> rowsInPart_)) & all;
+    }
+
+private:
+    std::uint64_t parts_;
+    Index partsInRow_ = 1;
+    int rowsInPart_ = 0;  ///< log2
+};
+
+/// The first pass over a partition of which little is not zero: the sums of a few rows, each times
+/// the power of a ring's root, are less than a butterfly, and the other rows are not read.
+template <class Lanes, Index Radix>
+TESSALY_KERNEL_INLINE void splitSounding(const BlockTables& tables,
+                                         const float* samples,
+                                         std::uint64_t parts,
+                                         float* rows) {
+    const Index step = tables.columns / Radix;
+    const SoundingRows<Radix> sounding(parts, tables.columns);
+    for (Index p = 0; p < step; ++p) {
+        Complex<Lanes> sum[Radix];
+        const auto nothing = Lanes::broadcast(0.0f);
+        TESSALY_KERNEL_UNROLL
+        for (Index s = 0; s < Radix; ++s) {
+            sum[s] = {nothing, nothing};
+        }
+        std::uint64_t bits = sounding.of(p);
+        for (Index t = 0; bits != 0; ++t, bits >>= SoundingRows<Radix>::apart) {
+            if ((bits & 1) == 0) {
+                continue;
+            }
+            const auto value = Lanes::load(samples + Lanes::count * (p + t * step));
+            const float* const powers = tables.first + 2 * Radix * t;
+            TESSALY_KERNEL_UNROLL
+            for (Index s = 0; s < Radix; ++s) {
+                sum[s].re = Lanes::multiplyAdd(value, Lanes::broadcast(powers[2 * s]), sum[s].re);
+                sum[s].im =
+                    Lanes::multiplyAdd(value, Lanes::broadcast(powers[2 * s + 1]), sum[s].im);
+            }
+        }
+        TESSALY_KERNEL_UNROLL
+        for (Index s = 0; s < Radix; ++s) {
+            storeGroup(rows, p + s * step, sum[s]);
+        }
+    }
+}
+
+/// Not worth it from half of the parts on.
+TESSALY_KERNEL_INLINE bool isSparse(std::uint64_t parts) {
+    constexpr int most = 24;
+    int count = 0;
+    for (; parts != 0 && count <= most; ++count) {
+        parts &= parts - 1;
+    }
+    return count <= most;
+}
+
+template <class Lanes>
+void splitPartition(const BlockTables& tables,
+                    const float* samples,
+                    std::uint64_t parts,
+                    float* rows) {
+    const RingPasses all(tables);
+    const RingPasses::Pass& first = all.passes[0];
+    if (tables.points < 64 || !isSparse(parts)) {
+        const StartSource<Lanes> source{samples};
+        splitBy<Lanes>(first.radix, source, rows, first.n, first.rings, first.roots);
+    } else if (first.radix == 8) {
+        splitSounding<Lanes, 8>(tables, samples, parts, rows);
+    } else if (first.radix == 4) {
+        splitSounding<Lanes, 4>(tables, samples, parts, rows);
+    } else {
+        splitSounding<Lanes, 2>(tables, samples, parts, rows);
+    }
+    splitRest<Lanes>(all, rows);
 }
 
 /// The passes across the lanes work on four rows at a time, which is what the registers hold
@@ -389,8 +492,11 @@ void windowLanes(const BlockTables& tables, const float* input, ComplexBin* bins
 }
 
 template <class Lanes>
-void partitionLanes(const BlockTables& tables, const float* input, ComplexBin* bins) {
-    splitAll<Lanes>(tables, StartSource<Lanes>{input}, floats(bins));
+void partitionLanes(const BlockTables& tables,
+                    const float* input,
+                    ComplexBin* bins,
+                    std::uint64_t sounding) {
+    splitPartition<Lanes>(tables, input, sounding, floats(bins));
     if constexpr (Lanes::count > 1) {
         splitAcross<Lanes>(tables, floats(bins));
     }

@@ -40,8 +40,12 @@ struct TransformsOver {
     static void window(const BlockTables& tables, const float* input, ComplexBin* bins) {
         with(tables.lanes, [&]<class Lanes>() { windowLanes<Lanes>(tables, input, bins); });
     }
-    static void partition(const BlockTables& tables, const float* input, ComplexBin* bins) {
-        with(tables.lanes, [&]<class Lanes>() { partitionLanes<Lanes>(tables, input, bins); });
+    static void partition(const BlockTables& tables,
+                          const float* input,
+                          ComplexBin* bins,
+                          std::uint64_t sounding) {
+        with(tables.lanes,
+             [&]<class Lanes>() { partitionLanes<Lanes>(tables, input, bins, sounding); });
     }
     static void block(const BlockTables& tables,
                       const ComplexBin* bins,
