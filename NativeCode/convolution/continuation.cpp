@@ -21,6 +21,7 @@ void Continuation::prepare(const Kernels& kernels,
     lanes_ = kernels.transformLanes(samples);
     taps_ = AlignedArray<ComplexBin>(ears * partitions * samples);
     silent_.assign(partitions, 1);
+    quiet_.assign(partitions, 1);
     inputs_ = AlignedArray<ComplexBin>(partitions * samples);
     starts_ = AlignedArray<float>((ears + 1) * samples);
     partitions_ = partitions;
@@ -57,7 +58,11 @@ void Continuation::takeWindow(const float* window, bool follows) noexcept {
         both[samples + i] = newer[i] + older[i];
     }
     std::copy_n(window, samples, older);
-    computeWindow(transform_, both.data(), inputs_.data() + newest_ * samples);
+    // As in the sums of whole partitions, zeros are left out, whatever the taps are.
+    quiet_[newest_] = allZero(both.data() + samples, samples) ? 1 : 0;
+    if (quiet_[newest_] == 0) {
+        computeWindow(transform_, both.data(), inputs_.data() + newest_ * samples);
+    }
 }
 
 void Continuation::takeSilence(bool follows) noexcept {
@@ -65,7 +70,7 @@ void Continuation::takeSilence(bool follows) noexcept {
         return;
     }
     link(follows);
-    std::fill_n(inputs_.data() + newest_ * samples, samples, ComplexBin{});
+    quiet_[newest_] = 1;
 }
 
 void Continuation::forget() noexcept {
@@ -90,8 +95,8 @@ bool Continuation::sum(std::size_t begin, std::size_t end, bool add, ComplexBin*
     std::array<const ComplexBin*, mostPartitions> right;
     std::size_t count = 0;
     for (std::size_t k = begin; k < end; ++k) {
-        if (silent_[k] == 0) {
-            const std::size_t slot = (newest_ + partitions_ - k) % partitions_;
+        const std::size_t slot = (newest_ + partitions_ - k) % partitions_;
+        if (silent_[k] == 0 && quiet_[slot] == 0) {
             inputs[count] = inputs_.data() + slot * samples;
             left[count] = tapsOf(k, 0);
             right[count] = tapsOf(k, 1);

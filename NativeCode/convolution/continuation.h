@@ -12,9 +12,9 @@ namespace tessaly {
 
 struct Kernels;
 
-/// A crossfade hears a few samples of the response that the last block was made with. They need no
-/// convolution of their own: the block transform of the last result holds them already, in the half
-/// that overlap-save throws away.
+/// A crossfade hears a few samples of the response that the last block was made with. The block
+/// transform of the last result holds most of them already, in the half that overlap-save throws
+/// away: products of polynomials in u with u^2B = -1 (simd/negacyclic_template.h).
 ///
 /// There, sample j is the product's own start less what it goes on to be 2B samples later
 /// (u^2B = -1): p[j] - p[2B + j]. The start is a sum of j + 1 taps over samples that are known, and
@@ -30,7 +30,7 @@ public:
     /// Samples that can be told.
     static constexpr std::int32_t samples = 64;
     static constexpr std::size_t ears = 2;
-    static constexpr std::size_t mostPartitions = 48;
+    static constexpr std::size_t mostPartitions = 128;
 
     /// Load time: allocates. Without memory for a transform nothing is prepared.
     /// @param blockLength  B, at least `samples`
@@ -56,7 +56,7 @@ public:
         return {prepared() ? wrappedOf(ear) : nullptr, samples};
     }
     /// The wrapped samples stand, of a result that the first `partitions` made with the taps that
-    /// were taken. Samples that are no numbers do not. Block time.
+    /// were taken; a result with samples that are no numbers does not go on. Block time.
     void keep(std::size_t partitions) noexcept;
     /// The last result does not go on. Block time.
     void drop() noexcept { kept_ = 0; }
@@ -91,6 +91,7 @@ private:
     std::int32_t lanes_ = 1;            ///< of its spectra
     AlignedArray<ComplexBin> taps_;     ///< per partition and ear
     std::vector<std::uint8_t> silent_;  ///< per partition: both ears' taps are zeros
+    std::vector<std::uint8_t> quiet_;   ///< per input: it is zeros
     AlignedArray<ComplexBin> inputs_;   ///< x2 + x0 of each block, in a ring of `partitions_`
     std::size_t newest_ = 0;            ///< place in that ring
     AlignedArray<float> starts_;        ///< `wrappedOf` both ears and `olderStart`

@@ -9,6 +9,7 @@
 namespace tessaly {
 
 float* convClass::process() noexcept {
+    chooseMemory();
     followCompensation();
     continuation_.forget();
     settle();
@@ -23,6 +24,16 @@ float* convClass::process() noexcept {
     const RingView ring = borrowed ? RingView{FDL, nullptr, newestSlot()} : ownRing();
     render(ring, partner_ != nullptr ? partner_->ownRing() : ring);
     return outputL;
+}
+
+void convClass::clearSums(const EarSpectra& sums) const noexcept {
+    clearSpectrum(sums.left, binCount - 1);
+    clearSpectrum(sums.right, binCount - 1);
+}
+
+/// Memory that another thread's convolvers share is not for this block.
+void convClass::chooseMemory() noexcept {
+    inShared_ = shared_ != nullptr && std::this_thread::get_id() == sharedBy_;
 }
 
 void convClass::rest(convClass* taker) noexcept {
@@ -81,7 +92,8 @@ std::int32_t convClass::transformPartition(const float* samples,
 
 /// The first `samples` of the block at least, of both ears.
 /// @param alsoWrapped  and what they go on to be
-void convClass::transformBack(std::int32_t samples, bool alsoWrapped) noexcept {
+/// @return whether it is so, of both ears
+bool convClass::transformBack(std::int32_t samples, bool alsoWrapped) noexcept {
     const auto back = [&](const ComplexBin* sum, float* output, std::size_t ear) noexcept {
         if (naturalOrder_ || output == nullptr) {
             return IFFT(sum, output, ifftHandle);
@@ -89,8 +101,11 @@ void convClass::transformBack(std::int32_t samples, bool alsoWrapped) noexcept {
         return blockIFFT(sum, output + blockLength, samples, ifftHandle,
                          alsoWrapped ? continuation_.wrapped(ear) : WrappedSamples{});
     };
-    dftiStatus = back(accumL, outputL, 0);
-    dftiStatus = back(accumR, outputR, 1);
+    const EarSpectra sum = accumulators();
+    const std::int32_t leftStatus = back(sum.left, outputL, 0);
+    dftiStatus = back(sum.right, outputR, 1);
+    return leftStatus == transformOk && dftiStatus == transformOk && outputL != nullptr &&
+           outputR != nullptr;
 }
 
 convClass::RingView convClass::ownRing() const noexcept {
@@ -143,8 +158,7 @@ void convClass::render(const RingView& ring, const RingView& other, bool goesOn)
         }
     }
     if (!summed) {
-        clearSpectrum(accumL, binCount - 1);
-        clearSpectrum(accumR, binCount - 1);
+        clearSums(accumulators());
     }
     if (complete && !compensated) {
         const Layout layout = layoutOf(scaled_);
@@ -154,9 +168,9 @@ void convClass::render(const RingView& ring, const RingView& other, bool goesOn)
         subtractFarExpected(accumulators(), layout.gain);
     }
     const bool kept = goesOn && complete && !compensated;
-    transformBack(blockLength, kept);
+    const bool made = transformBack(blockLength, kept);
     if (kept) {
-        keepResult(layoutOf(scaled_).end);
+        keepResult(made, layoutOf(scaled_).end);
     }
     if (farHeard_) {
         far_->addTo(outputL + blockLength, outputR + blockLength, layoutOf(scaled_).gain,
@@ -204,7 +218,7 @@ bool convClass::addOwed(const RingView& ring, bool summed) noexcept {
         if (owed_[i] == 0) {
             continue;
         }
-        ComplexBin* const left = passing_ + std::ptrdiff_t{2} * pairs * stride_;
+        ComplexBin* const left = shared_ + std::ptrdiff_t{2} * (1 + pairs) * stride_;
         ComplexBin* const right = left + stride_;
         takePartition(i, left, right);
         const std::size_t slot = (ring.newest + partitions - i) % partitions;

@@ -48,24 +48,31 @@ void allocKeptSpectrum(ComplexBin*& slot, std::int32_t count) noexcept {
     }
 }
 
-/// Spectra that are made and used at once, by one convolver after the other as the process's flags
-/// want it anyway: what all sources share stays in the nearest cache. A convolver keeps the array
-/// that it found, so those that have become too short stay, too.
-using PassingSpectra = std::vector<AlignedArray<ComplexBin>>;
+/// Spectra that are made and used up within a block: what a thread's convolvers share stays in the
+/// nearest cache. For the process's life, since a convolver keeps the memory that it found, also if
+/// another one needs more, and a thread may come back under the same number. Loads write it and
+/// meet no other, as with the HRIR tables.
+struct ThreadSpectra {
+    std::thread::id thread;
+    AlignedArray<ComplexBin> memory;
+};
 
-PassingSpectra& passingSpectra() noexcept {
-    static ProcessLifetime<PassingSpectra> arrays;
-    return *arrays;
+std::vector<ThreadSpectra>& threadSpectra() noexcept {
+    static ProcessLifetime<std::vector<ThreadSpectra>> all;
+    return *all;
 }
 
-/// At least so many bins. @throws std::bad_alloc
-ComplexBin* findPassingSpectra(std::int32_t bins) {
-    PassingSpectra& arrays = passingSpectra();
+/// At least so many bins for the thread that asks. @throws std::bad_alloc
+ComplexBin* findThreadSpectra(std::int32_t bins) {
     const auto wanted = static_cast<std::size_t>(bins);
-    if (arrays.empty() || arrays.back().size() < wanted) {
-        arrays.emplace_back(wanted);
+    const std::thread::id thread = std::this_thread::get_id();
+    for (ThreadSpectra& one : threadSpectra()) {
+        if (one.thread == thread && one.memory.size() >= wanted) {
+            return one.memory.data();
+        }
     }
-    return arrays.back().data();
+    threadSpectra().push_back({thread, AlignedArray<ComplexBin>(wanted)});
+    return threadSpectra().back().memory.data();
 }
 
 /// Points `entries` at consecutive spectra of one block; all null without memory for it.
@@ -90,7 +97,7 @@ void resetConvolutionState() noexcept {
     HpTF_FreqBins = 0;
     hpTFtimeLength = 0;
     keptSpectra().release();
-    passingSpectra().clear();
+    threadSpectra().clear();
 }
 
 convClass::convClass(std::string instanceNameIn,
@@ -213,10 +220,8 @@ convClass::~convClass() {
         freeSpectrum(partsMemoryL_);
         freeSpectrum(partsMemoryR_);
     }
-    if (passing_ == nullptr) {
-        freeSpectrum(accumL);
-        freeSpectrum(accumR);
-    }
+    freeSpectrum(accumL);
+    freeSpectrum(accumR);
     freeSpectrum(end_.left);
     freeSpectrum(end_.right);
 }
@@ -271,16 +276,9 @@ void convClass::continueResults() {
     try {
         owed_.assign(partitions, 0);
         changedBefore_.assign(partitions, 0);
-        ComplexBin* const shared = findPassingSpectra(2 * (passingPairs + 1) * stride_);
+        shared_ = findThreadSpectra(2 * sharedPairs * stride_);
+        sharedBy_ = std::this_thread::get_id();
         continuation_.prepare(*kernels_, blockLength, partitions);
-        if (!continuation_.prepared()) {
-            return;
-        }
-        passing_ = shared;
-        freeSpectrum(accumL);
-        freeSpectrum(accumR);
-        accumL = passing_ + std::ptrdiff_t{2} * passingPairs * stride_;
-        accumR = accumL + stride_;
     } catch (const std::bad_alloc&) {
         logTrace("no memory for results that go on, each old response is convolved");
     }

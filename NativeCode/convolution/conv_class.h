@@ -4,6 +4,7 @@
 #include <cstdint>
 #include <memory>
 #include <string>
+#include <thread>
 #include <vector>
 
 #include "base/aligned_array.h"
@@ -122,10 +123,14 @@ public:
     /// In crossfade blocks one after the other the first samples of the old response come from what
     /// the last result goes on to be, and partitions that change in each of them keep no spectra.
     /// For whoever calls `beforeWriting`; behind `splitFarTail`, if that is called. Load time:
-    /// allocates, and takes memory that all convolvers share, so that from here on they run one
-    /// after the other. Without memory, and with many or short blocks, all is convolved.
+    /// allocates. Without memory, and with many or short blocks, all is convolved. Blocks on the
+    /// thread that calls this work in memory that all convolvers of that thread share; blocks on
+    /// another one do not, and keep all spectra.
     void continueResults();
     /// Once before each block, and before the responses are written for it. Block time.
+    /// Clearing the responses is writing, too. Where it is left out, or its promise broken, the
+    /// next old response is lost: the samples of partitions without spectra stand in the responses
+    /// only.
     /// @param crossfade  the block will be made, by `processCrossfade` with the same second
     ///                   instance, and its input window is that of the block before, moved on
     void beforeWriting(bool crossfade) noexcept;
@@ -207,9 +212,12 @@ public:
     ComplexBin* hpTFspectrumR = nullptr;
     std::vector<ComplexBin*> FDL;     ///< ring of input spectra in use
     std::vector<ComplexBin*> FDLown;  ///< first instance: its own ring, to restore `FDL` from
+    /// Of partitions that change in every block of a run of crossfades, see `continueResults`,
+    /// these are older ones.
     std::vector<ComplexBin*> filterPartsL;
     std::vector<ComplexBin*> filterPartsR;
-    ComplexBin* accumL = nullptr;  ///< result spectra of the current block
+    /// Result spectra of the current block, unless it works in shared memory (`continueResults`).
+    ComplexBin* accumL = nullptr;
     ComplexBin* accumR = nullptr;
     std::int16_t FDLpos = 0;  ///< ring index of the newest spectrum, 0 to N - 1
     std::int16_t FDLtoBUFConv = 1;
@@ -250,7 +258,12 @@ private:
     };
     ScaledPartitions scaledNow() const noexcept;
     RingView ownRing() const noexcept;
-    EarSpectra accumulators() const noexcept { return {accumL, accumR}; }
+    /// The first of `shared_`, or the instance's own.
+    EarSpectra accumulators() const noexcept {
+        return inShared_ ? EarSpectra{shared_, shared_ + stride_} : EarSpectra{accumL, accumR};
+    }
+    void chooseMemory() noexcept;
+    void clearSums(const EarSpectra& sums) const noexcept;
     bool takeInput(std::uint64_t block) noexcept;
     std::uint64_t blockNumber() const noexcept;
     void advanceFarTail(bool silent, bool taken = true) noexcept;
@@ -266,7 +279,7 @@ private:
     void continueOld(convClass& second,
                      const ScaledPartitions& before,
                      std::int32_t heard) noexcept;
-    void keepResult(std::size_t partitions) noexcept;
+    void keepResult(bool made, std::size_t partitions) noexcept;
     void chooseOwed() noexcept;
     void settle() noexcept;
     bool addOwed(const RingView& ring, bool summed) noexcept;
@@ -282,7 +295,7 @@ private:
     std::int32_t transformPartition(const float* samples,
                                     ComplexBin* spectrum,
                                     std::uint64_t sounding) noexcept;
-    void transformBack(std::int32_t samples, bool alsoWrapped = false) noexcept;
+    bool transformBack(std::int32_t samples, bool alsoWrapped = false) noexcept;
     /// Partitions [0, scaledBegin) of the uniform sums and [scaledBegin, end), which count `gain`
     /// times, as does the far tail behind them.
     struct Layout {
@@ -333,17 +346,20 @@ private:
     /// through `addOwed`. For partitions that change in each block.
     std::vector<std::uint8_t> owed_;
     std::int32_t owedCount_ = 0;
-    static constexpr std::int32_t passingPairs = 2;
-    ComplexBin* passing_ = nullptr;  ///< so many pairs of spectra on their way, `stride_` apart;
-                                     ///< one more is `accumL` and `accumR` then
+    static constexpr std::int32_t passingPairs = 2;  ///< of spectra on their way
+    static constexpr std::int32_t sharedPairs = 1 + passingPairs;
+    ComplexBin* shared_ = nullptr;             ///< the sums' pair and those, `stride_` apart
+    std::thread::id sharedBy_;                 ///< the thread that alone may use it
+    bool inShared_ = false;                    ///< this block does
     std::vector<std::uint8_t> changedBefore_;  ///< as `changed_`, in the block before
     bool naturalOrder_ = false;                ///< of all spectra; once so, for good
     AlignedArray<float> padded_;               ///< a partition and B zeros, for natural order
     PartitionSums sums_;
     EarSpectra end_;  ///< sum over the scaled end, without its gain
 
-    /// Per ear the first samples of the response as last transformed, and what they were more than
-    /// what they are. A change of these alone is heard in the old block without a transform.
+    /// Per ear the first samples of the response as last transformed, but while the first partition
+    /// is owed, and what they were more than what they are. A change of these alone is heard in the
+    /// old block without a transform.
     static constexpr std::int32_t directTaps = 256;
     AlignedArray<float> startTaps_;
     AlignedArray<float> startChange_;

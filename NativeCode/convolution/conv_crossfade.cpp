@@ -36,6 +36,7 @@ bool convClass::sharesWith(const convClass& second) noexcept {
 }
 
 void convClass::processCrossfade(convClass& second, std::int32_t heardOfOld) noexcept {
+    chooseMemory();
     followCompensation();
     if (naturalOrder_ && !second.naturalOrder_) {
         second.useNaturalOrder();  // it has slept while compensation came and went
@@ -124,8 +125,8 @@ bool convClass::mayContinue() const noexcept {
 }
 
 void convClass::beforeWriting(bool crossfade) noexcept {
-    windowFollows_ = crossfade;
-    if (!crossfade) {
+    // A promise that still stands is one of a block that was not made.
+    if (std::exchange(windowFollows_, crossfade) || !crossfade) {
         continuation_.forget();
     }
     if (!mayContinue()) {
@@ -135,7 +136,7 @@ void convClass::beforeWriting(bool crossfade) noexcept {
 
 /// What has changed in the last block and in this one will change in the next.
 void convClass::chooseOwed() noexcept {
-    const std::size_t end = std::min(owed_.size(), layoutOf(scaled_).scaledBegin);
+    const std::size_t end = inShared_ ? std::min(owed_.size(), layoutOf(scaled_).scaledBegin) : 0;
     for (std::size_t i = 0; i < owed_.size(); ++i) {
         const bool owed = i < end && changed_[i] != 0 && changedBefore_[i] != 0;
         const bool before = std::exchange(owed_[i], owed ? 1 : 0) != 0;
@@ -174,8 +175,7 @@ void convClass::continueOld(convClass& second,
     addFarHeld();
     if (!sums_.empty() || (farHeard_ && !farExpected_.empty())) {
         if (!some) {
-            clearSpectrum(sum.left, binCount - 1);
-            clearSpectrum(sum.right, binCount - 1);
+            clearSums(sum);
         }
         sums_.addTo(sum, gain);
         subtractFarExpected(sum, gain);
@@ -197,9 +197,9 @@ void convClass::continueOld(convClass& second,
 }
 
 /// A result stands that partitions below `partitions` made, beside the far tail.
-void convClass::keepResult(std::size_t partitions) noexcept {
+void convClass::keepResult(bool made, std::size_t partitions) noexcept {
     const bool alone = !farHeard_ || (farHeld_.empty() && farExpected_.empty());
-    if (alone && !naturalOrder_) {
+    if (made && alone && !naturalOrder_) {
         continuation_.keep(partitions);
     } else {
         continuation_.drop();
@@ -227,16 +227,14 @@ void convClass::renderBoth(convClass& second,
 
     collect(ring, 0, lastBegin, Pick::untouched);
     if (!sums_.store(accumulators())) {
-        clearSpectrum(accumL, binCount - 1);
-        clearSpectrum(accumR, binCount - 1);
+        clearSums(accumulators());
     }
     collect(ring, lastBegin, old.end, Pick::untouched);
     addFarHeld();
     bool hasEnd = sums_.store(end_);
     if (farHeard_ && !farExpected_.empty()) {
         if (!hasEnd) {
-            clearSpectrum(end_.left, binCount - 1);
-            clearSpectrum(end_.right, binCount - 1);
+            clearSums(end_);
         }
         subtractFarExpected(end_, 1.0f);
         hasEnd = true;
@@ -259,8 +257,8 @@ void convClass::renderBoth(convClass& second,
     second.transformBack(heard);
     transformChanged();
     addOwn(now, accumulators());
-    transformBack(blockLength, continuation_.prepared());
-    keepResult(now.end);
+    const bool made = transformBack(blockLength, continuation_.prepared());
+    keepResult(made, now.end);
     if (farHeard_) {
         far_->addTo(second.outputL + blockLength, second.outputR + blockLength, old.gain, heard);
         far_->addTo(outputL + blockLength, outputR + blockLength, now.gain, blockLength);

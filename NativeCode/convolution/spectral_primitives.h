@@ -71,7 +71,7 @@ std::int32_t computePartition(const TransformHandle& handle,
                               std::uint64_t sounding = ~std::uint64_t{
                                   0}) noexcept TESSALY_NONBLOCKING;
 /// The start of the other half of such a result: what the half that is heard gives, continued by B
-/// samples, is taken away there from the product's own start (u^2B = -1).
+/// samples, is taken away there from the product's own start (in simd/negacyclic_template.h why).
 struct WrappedSamples {
     float* output = nullptr;   ///< room for `samples` and 15 more, up to B; null: none wanted
     std::int32_t samples = 0;  ///< samples 0 to `samples` - 1 of the window, up to B

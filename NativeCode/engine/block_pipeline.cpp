@@ -19,6 +19,9 @@ namespace {
 constexpr float forcedInterpAngleOffset = 2.5f;  // degrees, half a grid step
 constexpr std::uint32_t silencePatience = 16;    // blocks before silence is relied on
 
+static_assert(OutputStage::crossfadeLength <= Continuation::samples,
+              "of the old response no more is heard than a result goes on to be");
+
 void moveReflections(EngineState& state) noexcept {
     if (state.switches.qvFlexReflections && state.switches.qvTrackDirection) {
         updateReflections(state.reflections, state.direction, state.law, state.controls,

@@ -368,7 +368,9 @@ int SpatialEngine::Stop() {
     logOutput(stopLine);
     EngineState& state = *state_;
     if (state.complete) {
-        catchUpWithResponse(state);  // the convolver's spectra outlast this
+        // The convolver's spectra outlast this, those too that it has not made yet.
+        state.firstOLS->beforeWriting(false);
+        catchUpWithResponse(state);
     }
     state.frontEnd.inputHistoryBuffer.clear();
     state.composer.filterLeftBuffer.clear();

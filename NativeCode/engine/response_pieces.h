@@ -45,7 +45,7 @@ public:
     PieceList() = default;
     PieceList(const PieceList&) = default;
     ~PieceList() = default;
-    /// Of a long array the few that are there.
+    /// Copies the pieces that are there and not the whole array.
     PieceList& operator=(const PieceList& other) noexcept {
         if (this != &other) {
             std::copy(other.begin(), other.end(), pieces_.begin());

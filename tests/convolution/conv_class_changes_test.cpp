@@ -295,7 +295,17 @@ TEST_P(ChangingResponse, OldResponsesOfARunOfMovesGoOnFromTheLastResult) {
             setEnd(last, -0.25f);
         }
         run(round > 0);
+        begin(false);
         run(false);
+    }
+    // What changes in each block falls into the end with a gain, and comes out of it.
+    for (int n = 0; n < 2 * partitions + 6; ++n) {
+        SCOPED_TRACE(n);
+        move(true);
+        begin(true);
+        write(0, 5, 0.5f);
+        setEnd(n % 3 == 2 ? 0 : last, 0.5f);
+        run(true);
     }
     if (last + 2 * block() < size()) {
         for (int n = 0; n < 2 * partitions; ++n) {
@@ -338,6 +348,50 @@ TEST_P(ChangingResponse, ABlockThatNobodyMadeIsNoBlockToGoOnFrom) {
     move();
     ASSERT_GT(largest, 0.0);
     EXPECT_LT(worst / largest, 1e-6);
+}
+
+/// A promise that is broken costs the old response, and no more.
+TEST_P(ChangingResponse, ABlockThatWasPromisedAndNotMadeIsForgotten) {
+    write(0, size(), 0.5f);
+    run(true);
+    for (int n = 0; n < GetParam().partitions + 4; ++n) {
+        begin(true);
+        write(0, block(), 0.5f);
+        run(true);
+    }
+    begin(true);
+    plain.feed(noise.samples(static_cast<std::size_t>(block())));
+    spared.window = plain.window;
+    begin(true);
+    write(0, block(), 0.5f);
+    run(true);
+    EXPECT_FALSE(spared.first->oldContinued());
+    ASSERT_GT(largest, 0.0);
+    EXPECT_LT(worst / largest, 1e-6) << "nothing had been written for it";
+}
+
+TEST_P(ChangingResponse, NoNumbersOfAResponseThatMeetOnlySilenceAreNotHeard) {
+    silent = true;
+    begin(true);
+    write(0, size(), 0.5f);
+    run(true);
+    const auto at = static_cast<std::size_t>(size() - block());
+    for (int n = 0; n < 3 * GetParam().partitions + 3; ++n) {
+        SCOPED_TRACE(n);
+        // Sound comes in behind, so that the last partition meets none of it for a while.
+        silent = n < GetParam().partitions + 2;
+        begin(true);
+        write(0, size(), 0.5f);
+        spared.filterLeft[at] = n % 2 == 0 ? NAN : INFINITY;
+        run(true);
+        bool numbers = true;
+        for (int i = 0; i < heard(); ++i) {
+            numbers =
+                numbers && std::isfinite(spared.secondLeft[static_cast<std::size_t>(block() + i)]);
+        }
+        const bool sounds = n >= GetParam().partitions + 2 + GetParam().partitions - 1;
+        EXPECT_TRUE(numbers || sounds);
+    }
 }
 
 class ChangingFarTail : public ChangingResponse {};

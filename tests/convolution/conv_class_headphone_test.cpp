@@ -192,6 +192,46 @@ TEST_F(ConvClassHeadphone, ComesAndGoesWithoutTakingWhatWasWrittenMeanwhile) {
     expectNear(model.output(model.ring, 0), rig.firstLeft, 32);
 }
 
+TEST_F(ConvClassHeadphone, IsSwitchedOnAndOffInARunOfMoves) {
+    ConvolverRig plain(64, 1);
+    lend(plain, 128);
+    plain.makeBoth();
+    ConvolverRig moving(64, 1);
+    moving.hpTFfilter = plain.hpTFfilter;
+    moving.heardOfOld = 64;
+    moving.makeBoth();
+    FirNotes notes;
+    moving.first->watch(&notes, 0);
+    moving.first->continueResults();
+    int continued = 0;
+    for (int n = 0; n < 40; ++n) {
+        SCOPED_TRACE(n);
+        for (ConvolverRig* const rig : {&plain, &moving}) {
+            rig->hpTFactive = n / 10 % 2 == 1;
+            rig->hpTFselect = rig->hpTFactive ? 1 : 0;
+        }
+        moving.first->beforeWriting(n > 0);
+        fillFilters(plain);
+        moving.filterLeft = plain.filterLeft;
+        moving.filterRight = plain.filterRight;
+        notes.written.include(0, static_cast<int>(moving.filterLeft.size()));
+        const std::vector<float> input = noise_.samples(64);
+        for (ConvolverRig* const rig : {&plain, &moving}) {
+            rig->feed(input);
+            rig->run(true);
+            // As an engine lends what the first instance has made meanwhile.
+            rig->second->hpTFspectrumL = rig->first->hpTFspectrumL;
+            rig->second->hpTFspectrumR = rig->first->hpTFspectrumR;
+        }
+        continued += moving.first->oldContinued() ? 1 : 0;
+        expectNear({plain.firstLeft.begin(), plain.firstLeft.end()}, moving.firstLeft, 64);
+        if (n > 0 && n % 10 > 1) {
+            expectNear({plain.secondLeft.begin(), plain.secondLeft.end()}, moving.secondLeft, 64);
+        }
+    }
+    EXPECT_GT(continued, 5);
+}
+
 TEST_F(ConvClassHeadphone, LaterInstancesReadTheCommonSpectrumAndMakeNone) {
     const LogCapture log;
     ConvolverRig rig(32, 1);
