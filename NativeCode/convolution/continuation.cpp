@@ -43,7 +43,7 @@ void Continuation::takeTaps(std::size_t partition, const float* left, const floa
 void Continuation::link(bool follows) noexcept {
     linked_ = follows && !broken_ ? std::min(linked_ + 1, partitions_) : 0;
     broken_ = false;
-    newest_ = (newest_ + 1) % partitions_;
+    newest_ = newest_ + 1 < partitions_ ? newest_ + 1 : 0;
 }
 
 void Continuation::takeWindow(const float* window, bool follows) noexcept {

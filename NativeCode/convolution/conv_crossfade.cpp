@@ -109,9 +109,9 @@ void convClass::processCrossfade(convClass& second, std::int32_t heardOfOld) noe
 bool convClass::followRing(const convClass& second) noexcept {
     const std::size_t slot = newestSlot();
     const std::uint64_t writes = second.ring_.writes();
-    const auto slots = static_cast<std::size_t>(FDLtoBUFConv);
+    const std::size_t next = followedSlot_ + 1;
     const bool follows = followed_ == &second && writes == followedWrites_ + 1 &&
-                         slot == (followedSlot_ + 1) % slots;
+                         slot == (next < static_cast<std::size_t>(FDLtoBUFConv) ? next : 0);
     followed_ = &second;
     followedWrites_ = writes;
     followedSlot_ = slot;

@@ -128,7 +128,10 @@ void advanceRings(EngineState& state) noexcept {
     convClass& first = *state.firstOLS;
     const int next = first.FDLpos + 1;
     const int count = state.sizes.fdlCount;
-    first.FDLpos = static_cast<std::int16_t>(next < count ? next : next % count);
+    // A division is dear for a block of silence, and needed only behind an index out of the ring.
+    first.FDLpos = static_cast<std::int16_t>(next < count    ? next
+                                             : next == count ? 0
+                                                             : next % count);
     if (state.secondOLS != nullptr) {
         state.secondOLS->FDLpos = first.FDLpos;
     }
