@@ -104,10 +104,11 @@ public:
 
     /// One crossfade block of the first instance and its second: the second takes the input into
     /// its ring and renders with the spectra as they stand, then this one updates them and renders
-    /// the same ring; its own ring stays as it is, newest slot included. The sum over partitions
-    /// that no update touches is made once for both; without any, the second's result is a copy of
-    /// this one's. Of the second's block only the first `heardOfOld` samples are promised. Block
-    /// time.
+    /// the same ring; its own ring stays as it is, newest slot included. So it sounds; what is made
+    /// is less: the sum over partitions that no update touches once for both, without any a copy of
+    /// this one's result for the second, and in a run of such blocks what the last result goes on
+    /// to be (`continueResults`). Of the second's block only the first `heardOfOld` samples are
+    /// promised. Block time.
     void processCrossfade(convClass& second, std::int32_t heardOfOld) noexcept;
 
     /// Who writes the responses tells here which samples, taken and cleared by each update, and
