@@ -3,6 +3,7 @@
 
 #include <algorithm>
 #include <array>
+#include <cmath>
 
 #include "base/silence.h"
 #include "convolution/simd/kernels.h"
@@ -80,12 +81,10 @@ void Continuation::forget() noexcept {
 }
 
 void Continuation::keep(std::size_t partitions) noexcept {
-    // Zero times what is no number is no number.
-    float check = 0.0f;
-    for (std::size_t i = 0; prepared() && i < ears * samples; ++i) {
-        check += 0.0f * starts_[i];
-    }
-    kept_ = check == 0.0f && partitions <= partitions_ ? partitions : 0;
+    const bool finite =
+        partitions <= partitions_ &&
+        std::all_of(wrappedOf(0), wrappedOf(ears), [](float x) { return std::isfinite(x); });
+    kept_ = finite ? partitions : 0;
 }
 
 /// The short convolutions of some partitions. @return whether there is anything

@@ -16,8 +16,8 @@ struct Kernels;
 /// transform of the last result holds most of them already, in the half that overlap-save throws
 /// away: products of polynomials in u with u^2B = -1 (simd/negacyclic_template.h).
 ///
-/// There, sample j is the product's own start less what it goes on to be 2B samples later
-/// (u^2B = -1): p[j] - p[2B + j]. The start is a sum of j + 1 taps over samples that are known, and
+/// There, sample j is the product's own start less what it goes on to be 2B samples later: p[j] -
+/// p[2B + j]. The start is a sum of j + 1 taps over samples that are known, and
 /// so is what the newest block adds to the rest. Both are sums over the same taps, the first ones
 /// of each partition:
 ///

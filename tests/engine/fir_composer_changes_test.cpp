@@ -125,6 +125,16 @@ protected:
                 FAIL() << "frame " << i << " is not in the notes";
             }
         }
+        std::vector<char> sounding(standing.size());
+        for (const FirStretch& stretch : notes.sounding) {
+            std::fill(sounding.begin() + std::clamp(stretch.begin, 0, sizes.firBufferSize),
+                      sounding.begin() + std::clamp(stretch.end, 0, sizes.firBufferSize), char{1});
+        }
+        for (int i = 0; i < sizes.firBufferSize; ++i) {
+            if (sounding[static_cast<std::size_t>(i)] == 0 && now[i] != 0.0f) {
+                FAIL() << "frame " << i << " sounds, and is not in the notes";
+            }
+        }
         standing.assign(now, now + sizes.firBufferSize);
         if (now == composer.filterRight) {
             standingEnd = notes.scaledEnd.begin;
@@ -261,6 +271,21 @@ TEST_F(ComposerChanges, SayWhichSamplesWereWritten) {
     composeBoth();
     EXPECT_EQ(take().end, sizes.firBufferSize);
     EXPECT_LT(worst, 1e-7);
+}
+
+TEST_F(ComposerChanges, SayWhatMaySoundOfAResponseWithoutATail) {
+    const LogCapture quiet;
+    setUp(0, false);
+    composeBoth();
+    int frames = 0;
+    for (const FirStretch& stretch : composer.notes.sounding) {
+        frames += stretch.end - stretch.begin;
+    }
+    EXPECT_GT(frames, 0);
+    EXPECT_LE(frames, 13 * switches.hrirLength) << "the direct sound and twelve reflections";
+    setUp(7000, false);
+    composeBoth();
+    EXPECT_EQ(composer.notes.soundingParts(0, sizes.firBufferSize), ~std::uint64_t{0});
 }
 
 TEST_F(ComposerChanges, ALaterReflectionMovesTheEndAndItStays) {

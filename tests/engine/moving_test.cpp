@@ -58,11 +58,14 @@ TEST_F(Moving, OldResponsesOfARunGoOnFromTheLastResult) {
         for (int n = 0; n < early; ++n) {
             move();
         }
+        const ComplexBin kept = rig_.state().firstOLS->filterPartsL[0][9];
         for (int n = 0; n < 20; ++n) {
             move();
             EXPECT_TRUE(rig_.state().firstOLS->oldContinued()) << preset << ", " << n;
+            EXPECT_EQ(rig_.state().firstOLS->filterPartsL[0][9].re, kept.re) << "no spectra are";
         }
         play();
+        EXPECT_NE(rig_.state().firstOLS->filterPartsL[0][9].re, kept.re) << "now it is needed";
         move();
         EXPECT_FALSE(rig_.state().firstOLS->oldContinued()) << "there was a block without a move";
         rig_.engine.reset();

@@ -1,5 +1,4 @@
-// The transform of overlap-save blocks and the sums of their products, written once over a lane
-// type.
+// The transform of overlap-save blocks, written once over a lane type.
 //
 // Only the second half of a block's result is heard, so it may be made by any product of
 // polynomials that leaves this half alone: with u^M = i in place of u^(2M) = 1 a window of 2M reals
@@ -15,6 +14,7 @@
 #pragma once
 
 #include "convolution/simd/complex_lanes.h"
+#include "convolution/simd/sparse_pass_template.h"
 
 namespace tessaly {
 namespace {
@@ -157,83 +157,6 @@ void splitAll(const BlockTables& tables, const Source& source, float* rows) {
     const RingPasses::Pass& first = all.passes[0];
     splitBy<Lanes>(first.radix, source, rows, first.n, first.rings, first.roots);
     splitRest<Lanes>(all, rows);
-}
-
-/// Which of the K rows sound, from the 64 parts of all samples. Butterflies of a pass take rows
-/// that lie as far apart as K / R, and so do their bits by 64 / R.
-template <Index Radix>
-class SoundingRows {
-public:
-    static constexpr int apart = 64 / static_cast<int>(Radix);
-
-    SoundingRows(std::uint64_t parts, Index rows) : parts_(parts) {
-        for (; rows < 64; rows *= 2) {
-            // A row is several parts: what any of them holds, at the bit of the first.
-            parts_ |= parts_ >> partsInRow_;
-            partsInRow_ *= 2;
-        }
-        for (; rows > 64; rows /= 2) {
-            ++rowsInPart_;
-        }
-    }
-    /// At bit `apart` t: row p + t K / R.
-    std::uint64_t of(Index p) const {
-        constexpr std::uint64_t all =
-            ~std::uint64_t{0} / ((std::uint64_t{1} << (apart - 1)) * 2 - 1);
-        return (parts_ >> ((p * partsInRow_) >> rowsInPart_)) & all;
-    }
-
-private:
-    std::uint64_t parts_;
-    Index partsInRow_ = 1;
-    int rowsInPart_ = 0;  ///< log2
-};
-
-/// The first pass over a partition of which little is not zero: the sums of a few rows, each times
-/// the power of a ring's root, are less than a butterfly, and the other rows are not read.
-template <class Lanes, Index Radix>
-TESSALY_KERNEL_INLINE void splitSounding(const BlockTables& tables,
-                                         const float* samples,
-                                         std::uint64_t parts,
-                                         float* rows) {
-    const Index step = tables.columns / Radix;
-    const SoundingRows<Radix> sounding(parts, tables.columns);
-    for (Index p = 0; p < step; ++p) {
-        Complex<Lanes> sum[Radix];
-        const auto nothing = Lanes::broadcast(0.0f);
-        TESSALY_KERNEL_UNROLL
-        for (Index s = 0; s < Radix; ++s) {
-            sum[s] = {nothing, nothing};
-        }
-        std::uint64_t bits = sounding.of(p);
-        for (Index t = 0; bits != 0; ++t, bits >>= SoundingRows<Radix>::apart) {
-            if ((bits & 1) == 0) {
-                continue;
-            }
-            const auto value = Lanes::load(samples + Lanes::count * (p + t * step));
-            const float* const powers = tables.first + 2 * Radix * t;
-            TESSALY_KERNEL_UNROLL
-            for (Index s = 0; s < Radix; ++s) {
-                sum[s].re = Lanes::multiplyAdd(value, Lanes::broadcast(powers[2 * s]), sum[s].re);
-                sum[s].im =
-                    Lanes::multiplyAdd(value, Lanes::broadcast(powers[2 * s + 1]), sum[s].im);
-            }
-        }
-        TESSALY_KERNEL_UNROLL
-        for (Index s = 0; s < Radix; ++s) {
-            storeGroup(rows, p + s * step, sum[s]);
-        }
-    }
-}
-
-/// Not worth it from half of the parts on.
-TESSALY_KERNEL_INLINE bool isSparse(std::uint64_t parts) {
-    constexpr int most = 24;
-    int count = 0;
-    for (; parts != 0 && count <= most; ++count) {
-        parts &= parts - 1;
-    }
-    return count <= most;
 }
 
 template <class Lanes>
@@ -524,87 +447,6 @@ void blockLanes(const BlockTables& tables,
     const BlockSink<Lanes> result{output, wrapped, rowsOf(wrappedSamples)};
     joinAll<Lanes>(tables, work, result,
                    rowsOf(samples > wrappedSamples ? samples : wrappedSamples));
-}
-
-// ---- Sums of products of such spectra ----
-
-/// Adds `Group` products to what `base` holds, or to nothing.
-template <class Lanes, int Group>
-void sumRows(std::size_t rows,
-             const float* const (&input)[Group],
-             const float* const (&left)[Group],
-             const float* const (&right)[Group],
-             const float* baseL,
-             const float* baseR,
-             float* sumL,
-             float* sumR) {
-    for (std::size_t k = 0; k < rows; ++k) {
-        const auto j = static_cast<Index>(k);
-        const auto zero = Complex<Lanes>{Lanes::broadcast(0.0f), Lanes::broadcast(0.0f)};
-        Complex<Lanes> l = baseL != nullptr ? loadGroup<Lanes>(baseL, j) : zero;
-        Complex<Lanes> r = baseR != nullptr ? loadGroup<Lanes>(baseR, j) : zero;
-        TESSALY_KERNEL_UNROLL
-        for (int g = 0; g < Group; ++g) {
-            const Complex<Lanes> x = loadGroup<Lanes>(input[g], j);
-            const auto add = [&x](Complex<Lanes>& sum, const Complex<Lanes>& h) {
-                sum.re = Lanes::multiplyAdd(x.re, h.re, sum.re);
-                sum.im = Lanes::multiplyAdd(x.re, h.im, sum.im);
-                sum.re = Lanes::negateMultiplyAdd(x.im, h.im, sum.re);
-                sum.im = Lanes::multiplyAdd(x.im, h.re, sum.im);
-            };
-            add(l, loadGroup<Lanes>(left[g], j));
-            add(r, loadGroup<Lanes>(right[g], j));
-        }
-        storeGroup(sumL, j, l);
-        storeGroup(sumR, j, r);
-    }
-}
-
-/// Products are taken four at a time: twelve streams of memory keep the prefetchers busy, and the
-/// sums, which stay in the nearest cache, are touched once for four products.
-template <class Lanes>
-void sumProducts(std::size_t bins,
-                 std::size_t count,
-                 const ComplexBin* const* input,
-                 const ComplexBin* const* left,
-                 const ComplexBin* const* right,
-                 const ComplexBin* baseL,
-                 const ComplexBin* baseR,
-                 ComplexBin* sumL,
-                 ComplexBin* sumR) {
-    constexpr std::size_t group = 4;
-    const std::size_t rows = bins / static_cast<std::size_t>(Lanes::count);
-    const float* fromL = baseL != nullptr ? floats(baseL) : nullptr;
-    const float* fromR = baseR != nullptr ? floats(baseR) : nullptr;
-    float* const toL = floats(sumL);
-    float* const toR = floats(sumR);
-    const auto take = [&]<int Group>() {
-        const float* x[Group];
-        const float* l[Group];
-        const float* r[Group];
-        TESSALY_KERNEL_UNROLL
-        for (int g = 0; g < Group; ++g) {
-            x[g] = floats(input[g]);
-            l[g] = floats(left[g]);
-            r[g] = floats(right[g]);
-        }
-        sumRows<Lanes, Group>(rows, x, l, r, fromL, fromR, toL, toR);
-        input += Group;
-        left += Group;
-        right += Group;
-        fromL = toL;
-        fromR = toR;
-    };
-    for (; count >= group; count -= group) {
-        take.template operator()<4>();
-    }
-    if (count == 3) {
-        take.template operator()<3>();
-    } else if (count == 2) {
-        take.template operator()<2>();
-    } else if (count == 1) {
-        take.template operator()<1>();
-    }
 }
 
 }  // namespace

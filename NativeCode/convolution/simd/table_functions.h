@@ -6,6 +6,7 @@
 #include "convolution/simd/kernels.h"
 #include "convolution/simd/lanes_scalar.h"
 #include "convolution/simd/negacyclic_template.h"
+#include "convolution/simd/products_template.h"
 
 namespace tessaly {
 namespace {
