@@ -283,6 +283,7 @@ TEST_F(ComposerChanges, SayWhatMaySoundOfAResponseWithoutATail) {
     }
     EXPECT_GT(frames, 0);
     EXPECT_LE(frames, 13 * switches.hrirLength) << "the direct sound and twelve reflections";
+    reflections = {};
     setUp(7000, false);
     composeBoth();
     EXPECT_EQ(composer.notes.soundingParts(0, sizes.firBufferSize), ~std::uint64_t{0});
